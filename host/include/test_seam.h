@@ -1,0 +1,61 @@
+#pragma once
+// For tests only: what the host library can be made to do. Nothing here is called by the component or the daemon.
+// Objects of these classes act while they live; at most one of each class at a time.
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "ras1.h"
+
+/// Turns every level of every unit on and keeps the lines in memory instead of writing them.
+class TEST_TraceCapture {
+ public:
+  struct Line {
+    RAS1_Level level;
+    std::string unit;      ///< "tasks/start_stop"
+    std::string function;  ///< as given to RAS1_Printf
+    std::string text;      ///< formatted, exactly as passed: line feeds kept. Entry and exit lines: "entry" and "exit"
+  };
+  TEST_TraceCapture();
+  ~TEST_TraceCapture();
+  TEST_TraceCapture(const TEST_TraceCapture&) = delete;
+  TEST_TraceCapture& operator=(const TEST_TraceCapture&) = delete;
+
+  [[nodiscard]] std::vector<Line> lines() const;
+  /// The texts of one level, in order.
+  [[nodiscard]] std::vector<std::string> texts(RAS1_Level level) const;
+  /// True when some line of the level has exactly this text.
+  [[nodiscard]] bool has(RAS1_Level level, const std::string& text) const;
+  /// True when some line of the level has a text that begins so.
+  [[nodiscard]] bool hasPrefix(RAS1_Level level, const std::string& prefix) const;
+  void clear();
+};
+
+/// Replaces the passing of time: BSS1_Sleep records its seconds, moves the clocks (BSS1_GetTime, BSS1_GetElapsed)
+/// forward by them and returns at once; BSS1_TimedWait waits a few real milliseconds for its signal, then moves the
+/// clocks forward by its whole time and returns ETIMEDOUT. In between, the clocks run on as usual.
+class TEST_RecordedSleeps {
+ public:
+  TEST_RecordedSleeps();
+  ~TEST_RecordedSleeps();
+  TEST_RecordedSleeps(const TEST_RecordedSleeps&) = delete;
+  TEST_RecordedSleeps& operator=(const TEST_RecordedSleeps&) = delete;
+
+  [[nodiscard]] std::vector<unsigned> seconds() const;         ///< of each BSS1_Sleep, in order
+  [[nodiscard]] std::vector<int64_t> waitedMilliseconds() const;  ///< of each BSS1_TimedWait that timed out
+};
+
+/// Makes one call of a service fail: the n-th from now on (n = 1: the next). Services are named like their functions,
+/// "FSI1_NewList"; the result is the given status (a null result for those that return pointers, 0 for XML1_ParseBuffer).
+/// Those that can fail so: BSS1_GetEnv (its default), BSS1_PutEnv, BSS1_GetLock, BSS1_ReleaseLock, FSI1_*, XML1_ParserCreate,
+/// XML1_GetBuffer, XML1_ParseBuffer, NLS2_GetLocale, RegisterWithManager, InsertRow, Dispatch.
+class TEST_FailCall {
+ public:
+  TEST_FailCall(const std::string& service, unsigned n, int status);
+  ~TEST_FailCall();
+  TEST_FailCall(const TEST_FailCall&) = delete;
+  TEST_FailCall& operator=(const TEST_FailCall&) = delete;
+  [[nodiscard]] bool happened() const;
+};

@@ -1,0 +1,45 @@
+#pragma once
+// Result codes of deployment tasks.
+
+/// 0 is success; 1001 to 1035 are the failures, each with the message id "VMQ" + code + "E" ("VMQ1035I" for 1035).
+enum TASK_RC : int {
+  TASK_OK = 0,
+  TASK_NO_COMMAND = 1001,
+  TASK_NO_TRANSID = 1002,
+  TASK_NO_PRODUCT = 1003,
+  TASK_NO_CONTEXT = 1004,
+  TASK_NO_TARGETMSN = 1005,
+  TASK_COMMAND_NOT_SUPPORTED = 1006,
+  TASK_NO_TRANSLATOR = 1007,
+  TASK_TRANSLATOR_FAILED = 1008,       ///< it ran and exited non-zero
+  TASK_TRANSLATOR_NOT_STARTED = 1009,  ///< it could not be started
+  TASK_NO_DEPOT = 1010,
+  TASK_NO_META_PATH = 1011,
+  TASK_NO_WORK_PATH = 1012,
+  TASK_NO_RB_PATH = 1013,
+  TASK_MODEL_NOT_COPIED = 1014,
+  TASK_SCRIPT_NOT_COPIED = 1015,
+  TASK_IMPORT_FAILED = 1016,
+  TASK_DELETE_NOT_STARTED = 1017,
+  TASK_IMPORT_NOT_STARTED = 1018,
+  TASK_PRODUCT_NOT_INSTALLED = 1019,
+  TASK_NO_AGENT_CONFIG = 1020,
+  TASK_WORK_PATH_NOT_PARSED = 1021,
+  TASK_GETDPTYPE_NOT_STARTED = 1022,
+  TASK_NO_DPTYPE = 1023,
+  TASK_STARTSTOP_FAILED = 1024,       ///< the control script ran and exited non-zero
+  TASK_STARTSTOP_NOT_STARTED = 1025,  ///< the control script could not be started
+  TASK_AGENT_NOT_STARTED = 1026,
+  TASK_AGENT_NOT_STOPPED = 1027,
+  TASK_STARTUP_PARMS_NOT_UPDATED = 1028,
+  TASK_NO_VERSION = 1029,
+  TASK_INSTALL_NOT_STARTED = 1030,
+  TASK_INSTALL_FAILED = 1031,
+  TASK_UNINSTALL_FAILED = 1032,
+  TASK_UNINSTALL_NOT_STARTED = 1033,
+  TASK_NO_PRODUCT_ARCHITECTURE = 1034,
+  TASK_INFORMATION = 1035,
+};
+
+/// The message id of a result, static text: "" for 0 and 1000 and for every value outside the table.
+char* rcToMsgId(TASK_RC rc);

@@ -1,0 +1,3 @@
+#include "util/corvel_home.h"
+
+const char* VMQ_CORVELHOME = nullptr;
