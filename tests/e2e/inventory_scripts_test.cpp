@@ -1,0 +1,103 @@
+// The other tools of the sample home: the inventory, the architecture probe and the two-way translator.
+
+#include <gmock/gmock.h>
+
+#include <filesystem>
+
+#include "tests/e2e/sample_home.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+using testing::HasSubstr;
+using testing::StartsWith;
+
+constexpr char header[] = "\"ProdCode\",\"Description\",\"Platform\",\"Version\",\"Release\"\n";
+
+class SampleTools : public testing::Test {
+ protected:
+  Outcome inventory(const std::string& arguments) { return runShell(quoted(home / "bin/qinfo") + " " + arguments); }
+  Outcome translator(const std::string& arguments) {
+    return runShell(quoted(home / "zlpqor6/lx8266/bin/vmq_xa") + " " + arguments);
+  }
+
+  SampleHome home;
+};
+
+TEST_F(SampleTools, InventoryListsTheAgentAndTheSharedLibraries) {
+  const Outcome outcome = inventory("-d");
+  EXPECT_EQ(outcome.exit_code, 0);
+  EXPECT_THAT(outcome.output, StartsWith(header));
+  EXPECT_THAT(outcome.output, HasSubstr("\n\"ux\",\"Unix host agent\",\"lx8266\","));
+  EXPECT_THAT(outcome.output, HasSubstr("\n\"ax\","));
+}
+
+TEST_F(SampleTools, InventoryOfWhatRunsFollowsTheAgents) {
+  EXPECT_EQ(inventory("-r").output, header);
+  ASSERT_EQ(home.control("-o inst1 start ux").exit_code, 0);
+  EXPECT_THAT(inventory("-r").output, HasSubstr("\n\"ux\","));
+  ASSERT_EQ(home.control("-o inst1 stop ux").exit_code, 0);
+  EXPECT_EQ(inventory("-r").output, header);
+}
+
+TEST_F(SampleTools, PlatformListingNamesTheArchitectureOfTheProduct) {
+  EXPECT_EQ(inventory("-p ux").output, "Platform codes:\nlx8266 Product (ux)\n");
+  EXPECT_EQ(inventory("-p zz").output, "Platform codes:\n");
+}
+
+TEST_F(SampleTools, InventoryRefusesWhatItDoesNotUnderstand) {
+  for (const char* arguments : {"", "-z", "-d ux", "-p"}) EXPECT_EQ(inventory(arguments).exit_code, 64) << arguments;
+}
+
+TEST_F(SampleTools, ArchitectureProbeSetsBothVariables) {
+  const Outcome outcome = runShell("/bin/ksh -c '. " + (home / "bin/dynarch.shl") + " " +
+                                   (home / "registry/archdsc.tbl") + "; echo $os; echo $cArch'");
+  EXPECT_EQ(outcome.exit_code, 0);
+  EXPECT_THAT(outcome.output, testing::MatchesRegex("Linux\n(lx8266|lar64)\n"));
+}
+
+TEST_F(SampleTools, TranslatorFindsTheInstanceOfAManagedSystemName) {
+  EXPECT_EQ(translator("-i inst1:node7:UX -pc ux").output, "inst1\n");
+  EXPECT_EQ(translator("-i inst1 -pc ux").output, "inst1\n");
+  EXPECT_EQ(translator("-i node7:UX -pc ux").output, "\n");
+  EXPECT_EQ(translator("-i inst2:node7:UX -pc ux").exit_code, 1);
+}
+
+TEST_F(SampleTools, TranslatorPutsBackWhatItGot) {
+  const std::string before = translator("-g inst1 -pc ux").output;
+  EXPECT_THAT(before, StartsWith("INSTANCE=inst1\nPORT="));
+  EXPECT_EQ(
+      translator("-g inst1 -pc ux | " + quoted(home / "zlpqor6/lx8266/bin/vmq_xa") + " -p inst1 -pc ux").exit_code, 0);
+  EXPECT_EQ(translator("-g inst1 -pc ux").output, before);
+}
+
+TEST_F(SampleTools, TranslatorMakesAndRemovesAnInstance) {
+  const Outcome put = translator("-p inst2 -pc ux <<'END'\nINSTANCE=inst2\nPORT=19102\nPROGRAM=/bin/true\nEND");
+  EXPECT_EQ(put.exit_code, 0) << put.output;
+  EXPECT_EQ(readWholeFile(home / "config/ux_inst2.config"), "PORT=19102\nPROGRAM=/bin/true\n");
+  EXPECT_EQ(translator("-r inst2 -pc ux </dev/null").exit_code, 0);
+  EXPECT_FALSE(fs::exists(home / "config/ux_inst2.config"));
+}
+
+TEST_F(SampleTools, TranslatorWithoutANameMeansTheAgentItself) {
+  EXPECT_THAT(translator("-g  -pc ux").output, StartsWith("INSTANCE=\nPORT="));
+}
+
+TEST_F(SampleTools, TranslatorRefusesSettingsItDoesNotKnowAndKeepsTheOldOnes) {
+  const std::string before = readWholeFile(home / "config/ux_inst1.config");
+  for (const char* text : {"", "FOO=1", "PORT=", "PORT=1\nFOO=1", "PORT=1\nPROGRAM=relative", "PORT=x"}) {
+    const Outcome outcome = translator("-p inst1 -pc ux <<'END'\n" + std::string(text) + "\nEND");
+    EXPECT_EQ(outcome.exit_code, 1) << text;
+    EXPECT_EQ(readWholeFile(home / "config/ux_inst1.config"), before) << text;
+  }
+  EXPECT_EQ(runShell("ls " + quoted(home / "config")).output, "ux.config\nux_inst1.config\n") << "work files left";
+}
+
+TEST_F(SampleTools, TranslatorRefusesWhatItDoesNotUnderstand) {
+  for (const char* arguments : {"", "-g", "-g inst1", "-z inst1 -pc ux", "-g inst1 -pc"})
+    EXPECT_EQ(translator(arguments).exit_code, 64) << arguments;
+  for (const char* arguments : {"-g inst1 -pc lz", "-g ../ux -pc ux", "-g inst2 -pc ux", "-r inst2 -pc ux"})
+    EXPECT_EQ(translator(arguments).exit_code, 1) << arguments;
+}
+
+}  // namespace
