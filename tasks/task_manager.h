@@ -1,7 +1,6 @@
 #pragma once
 // Checks requests, runs the quick ones at once and queues the others for the one executor thread.
 
-#include <deque>
 #include <vector>
 
 #include "tasks/task_queue_elem.h"
@@ -36,3 +35,6 @@ std::vector<VMQ::String> getSupportedTasks();
 /// on purpose: also over an earlier failure in `rc`.
 TASK_RC requiredParameterOk(const VMQ::String& name, const VMQ::String& value, TaskQueueElem& request, TASK_RC rc,
                             TASK_RC errorRc);
+
+/// Back to the state before vmq_taskmgr_init. REQUIRES: no executor thread was started, no request is queued.
+void TEST_resetTaskManager();
