@@ -25,11 +25,12 @@ struct BSS1_Lock* BSS1_EnvironmentLock(void);
 
 /// A new recursive lock, or null without memory. The caller frees it with BSS1_DeleteLock.
 struct BSS1_Lock* BSS1_NewLock(void);
+/// REQUIRES: held by nobody.
 void BSS1_DeleteLock(struct BSS1_Lock* lock);
 
 /// Waits for the lock. Returns 0, or an errno value.
 int BSS1_GetLock(struct BSS1_Lock* lock);
-/// Gives the lock back. Returns 0, or an errno value. REQUIRES: held by the calling thread.
+/// Gives the lock back. Returns 0, or an errno value: EPERM when the calling thread does not hold it.
 int BSS1_ReleaseLock(struct BSS1_Lock* lock);
 
 // ---- time ------------------------------------------------------------------------------------------------------
@@ -56,6 +57,7 @@ struct BSS1_Once {
 #define BSS1_ONCE_INIT {PTHREAD_ONCE_INIT}
 
 /// Runs `initialize` in exactly one of the threads that call this with the same `once`; the others wait for its end.
+/// Returns 0, EINVAL for null, or ECANCELED when `initialize` threw in this call (it is not run again).
 int BSS1_InitializeOnce(struct BSS1_Once* once, void (*initialize)(void));
 
 }  // extern "C"

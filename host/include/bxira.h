@@ -4,6 +4,7 @@
 // A request object is created by its table's manager (TableManager::CreateBxira), put on the manager's list of open
 // requests, sampled when the requester asks for it, and destroyed by the framework when the requester closes it.
 
+#include <atomic>
 #include <cstdint>
 #include <mutex>
 #include <string>
@@ -33,7 +34,7 @@ struct FLT1_FILTERINFO {
   _IntfOper oper;
 };
 
-/// Takes the rows that a request dispatches.
+/// Takes the rows that a request dispatches, one call at a time.
 class RowRequester {
  public:
   virtual ~RowRequester() = default;
@@ -95,16 +96,21 @@ class bxira {
   /// The next predicate, in the order sent, with 0; non-zero after the last one, and the next call starts over.
   unsigned GetFilterInfo(FLT1_FILTERINFO* info);
 
-  /// Compares a character column of `width` bytes with a value: both blank-padded, the value cut at the width.
+  /// Compares a character column of `width` bytes with a value, as unsigned bytes: both blank-padded, the value cut at
+  /// the width. Zero bytes at the end of a column, as in one that was never filled in, count as padding.
   static unsigned IsException(_IntfOper oper, const char* text, unsigned width, const char* value);
-  /// Compares an integer column with a value in decimal text. A value that is no number matches nothing.
+  /// Compares an integer column with a value in decimal text. A value that is no 32-bit number from its first character
+  /// to its last matches nothing.
   static unsigned IsException(_IntfOper oper, int32_t number, const char* value);
 
-  /// Hands the waiting rows to the requester; does nothing (and returns 0) when none wait. Returns the requester's status.
+  /// Hands the waiting rows to the requester; does nothing (and returns 0) when none wait. Returns the requester's
+  /// status, ENOTCONN when there is no requester, or EIO when it threw. No row waits afterwards, delivered or not.
   unsigned Dispatch();
 
   /// Makes the request with this handle the calling thread's current one and counts a use. Returns 0 or ENOENT.
   static unsigned UseHandle(RES1_Handle handle);
+  /// What the calling thread has made current and not dropped since; 0 when there is nothing.
+  static RES1_Handle CurrentHandle();
   [[nodiscard]] RES1_Handle handle() const { return handle_; }
 
   [[nodiscard]] const RequestDetail& detail() const { return detail_; }
@@ -113,7 +119,9 @@ class bxira {
   [[nodiscard]] unsigned allocatedBytes() const;
   [[nodiscard]] const char* waitingRows() const;  ///< REQUIRES: no other thread inserts or dispatches meanwhile
 
-  unsigned row_count = 0;  ///< rows waiting for Dispatch; set back to 0 after each event, delivered or not
+  /// Rows waiting for Dispatch. For display: event delivery sets it back to 0 after each event, but a row that another
+  /// thread has inserted meanwhile still waits.
+  std::atomic<unsigned> row_count{0};
 
  private:
   unsigned rowBytes();
@@ -124,5 +132,6 @@ class bxira {
   RES1_Handle handle_;
   size_t next_predicate_ = 0;  // one thread at a time: construction, then the sampling thread
   mutable std::mutex rows_mutex_;
-  std::vector<char> rows_;  // guarded by rows_mutex_, like row_count
+  std::vector<char> rows_;  // guarded by rows_mutex_, like waiting_
+  unsigned waiting_ = 0;
 };

@@ -18,13 +18,14 @@ class RowBuffer : public RowRequester {
  public:
   explicit RowBuffer(unsigned maximum_rows) : maximum_rows_(maximum_rows) {}
 
+  /// Returns 0, or ENOBUFS when rows were dropped.
   unsigned rowsArrived(const char* rows, unsigned row_bytes, unsigned count) override;
 
   /// What take() found.
   struct Item {
     enum Kind { kRow, kLost, kTimedOut, kClosed } kind = kTimedOut;
     std::string row;    ///< for kRow
-    uint64_t lost = 0;  ///< for kLost: how many rows were dropped after the rows taken so far
+    uint64_t lost = 0;  ///< for kLost: how many rows are missing between the row before and the row after
   };
   /// The oldest item; waits for one until the time-out. Rows that were dropped are told once, at the place in the order
   /// where they are missing.
@@ -34,11 +35,14 @@ class RowBuffer : public RowRequester {
   void close();
 
  private:
+  bool keep(const char* row, unsigned row_bytes);
+
   const unsigned maximum_rows_;
   std::mutex mutex_;
   std::condition_variable changed_;
-  std::deque<std::string> rows_;  // these three guarded by mutex_
-  uint64_t lost_ = 0;
+  std::deque<Item> items_;    // kRow and, never two in a row, kLost; these four guarded by mutex_
+  unsigned rows_ = 0;         // how many of them are kRow
+  uint64_t lost_at_end_ = 0;  // dropped after the last of them
   bool closed_ = false;
 };
 

@@ -9,7 +9,7 @@
 
 class TableManager {
  public:
-  /// The texts are copied.
+  /// The texts are copied. Throws std::bad_alloc.
   TableManager(const char* application, const char* table);
   virtual ~TableManager();
   TableManager(const TableManager&) = delete;
@@ -18,8 +18,8 @@ class TableManager {
   /// A new request object, for the framework to destroy.
   virtual bxira* CreateBxira(RequestDetail* detail, ContextInfo* context) = 0;
 
-  /// Makes the table known under its application and table name. Returns 0, EINVAL for null, or EEXIST when the name is
-  /// taken. The manager must live as long as the process.
+  /// Makes the table known under its application and table name. Returns 0, EINVAL for null, EEXIST when the name is
+  /// taken, or ENOMEM. The manager must live as long as the process.
   static unsigned RegisterWithManager(TableManager* manager);
 
   [[nodiscard]] const char* application() const { return application_.c_str(); }
@@ -32,6 +32,6 @@ class TableManager {
  private:
   const std::string application_;
   const std::string table_;
+  const RES1_Handle handle_;
   BSS1_Lock* const lock_;
-  RES1_Handle handle_;
 };

@@ -1,0 +1,14 @@
+#pragma once
+// The environment for this library's own use: without the test seam.
+
+#include "bss1.h"
+
+namespace vmqhost {
+
+/// See BSS1_GetEnv.
+const char* environmentValue(const char* name, const char* defaultValue);
+
+/// Taken before every other lock of this library.
+extern constinit BSS1_Lock environmentLock;
+
+}  // namespace vmqhost
