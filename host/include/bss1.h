@@ -54,7 +54,8 @@ int BSS1_TimedWait(pthread_cond_t* condition, pthread_mutex_t* mutex, int64_t mi
 struct BSS1_Once {
   pthread_once_t once;
 };
-#define BSS1_ONCE_INIT {PTHREAD_ONCE_INIT}
+#define BSS1_ONCE_INIT \
+  { PTHREAD_ONCE_INIT }
 
 /// Runs `initialize` in exactly one of the threads that call this with the same `once`; the others wait for its end.
 /// Returns 0, EINVAL for null, or ECANCELED when `initialize` threw in this call (it is not run again).

@@ -38,8 +38,8 @@ struct FLT1_FILTERINFO {
 class RowRequester {
  public:
   virtual ~RowRequester() = default;
-  /// Takes `count` rows of `row_bytes` each, valid during the call. Called with the table's lock held for events: it must
-  /// not block and must not call the framework. Returns 0, or a status that Dispatch hands back.
+  /// Takes `count` rows of `row_bytes` each, valid during the call. Called with the table's lock held for events: it
+  /// must not block and must not call the framework. Returns 0, or a status that Dispatch hands back.
   virtual unsigned rowsArrived(const char* rows, unsigned row_bytes, unsigned count) = 0;
 };
 

@@ -34,10 +34,11 @@ int32_t NLS2_GetLocaleCodepageId(const struct NLS2_Locale* locale);
 uint32_t NLS2_toUTF16(struct NLS2_Locale* locale, const char* bytes, uint32_t byteCount, unsigned short* units,
                       uint32_t unitCapacity, int32_t* status);
 
-/// Converts `unitCount` UTF-16 code units to at most `byteCapacity` bytes. A unit that the code page cannot encode
-/// becomes the byte of the same value when it is below 0x100, else "?". When the output does not fit it is cut before
-/// the first character that does not, and always ends with a NUL (when `byteCapacity` is not 0). Returns the number of
-/// bytes stored, the NUL included; `*status` is 0 or ENOBUFS. A null locale converts as Latin-1.
+/// Converts `unitCount` UTF-16 code units (a 0 unit at their end is taken for the terminator) to at most `byteCapacity`
+/// bytes. A unit that the code page cannot encode becomes the byte of the same value when it is below 0x100, else "?".
+/// When the output does not fit it is cut before the first character that does not, and always ends with a NUL (when
+/// `byteCapacity` is not 0). Returns the number of bytes stored, the NUL included; `*status` is 0 or ENOBUFS. A null
+/// locale converts as Latin-1.
 uint32_t NLS2_fromUTF16(struct NLS2_Locale* locale, const unsigned short* units, uint32_t unitCount, char* bytes,
                         uint32_t byteCapacity, int32_t* status);
 

@@ -44,8 +44,8 @@ void RAS1_Event(RAS1_Unit* unit, RAS1_EventKind kind, int line, const char* func
 /// KBB_RAS1 does not follow its syntax or the log cannot be opened; the previous configuration then stays.
 /// Syntax of KBB_RAS1: items joined by ",", each `[unit-prefix=]level[+level...]` with the levels none, error, event,
 /// detail and all; an item without a prefix is for every unit; of the items that match a unit the last one counts.
-/// Example: "error,tasks/=all,util/string=none". Unset or empty is "error". The log is appended to; unset or empty
-/// means standard error.
+/// Example: "error,tasks/=all,util/string=none". Unset or empty is "error", and so is a unit that no item matches. The
+/// log is appended to; unset or empty means standard error.
 bool RAS1_Configure(char* error, unsigned long errorSize);
 
 }  // extern "C"
@@ -53,7 +53,8 @@ bool RAS1_Configure(char* error, unsigned long errorSize);
 /// True when lines of this level are wanted from the unit. One relaxed load when they are not.
 inline bool RAS1_Enabled(RAS1_Unit& unit, RAS1_Level level) {
   uint32_t levels = unit.levels.load(std::memory_order_relaxed);
-  if ((levels & level) == 0) [[likely]] return false;
+  if ((levels & level) == 0) [[likely]]
+    return false;
   if (levels == RAS1_UNRESOLVED) levels = RAS1_Sync(&unit);
   return (levels & level) != 0;
 }

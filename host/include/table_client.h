@@ -35,8 +35,8 @@ void setOriginNode(const std::string& node);
 /// An open request; closes it when destroyed.
 class OpenRequest {
  public:
-  /// Opens a request on a registered table; from the return on it receives the table's events. Null when there is no such
-  /// table, a predicate's value is longer than 65535 bytes or holds a NUL, or the component could not create the
+  /// Opens a request on a registered table; from the return on it receives the table's events. Null when there is no
+  /// such table, a predicate's value is longer than 65535 bytes or holds a NUL, or the component could not create the
   /// request. `requester` outlives the request.
   static std::unique_ptr<OpenRequest> open(const RequestDetail& detail, RowRequester& requester);
   ~OpenRequest();

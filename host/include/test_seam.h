@@ -35,7 +35,8 @@ class TEST_TraceCapture {
 
 /// Replaces the passing of time: BSS1_Sleep records its seconds, moves the clocks (BSS1_GetTime, BSS1_GetElapsed)
 /// forward by them and returns at once; BSS1_TimedWait waits a few real milliseconds for its signal, then moves the
-/// clocks forward by its whole time and returns ETIMEDOUT. In between, the clocks run on as usual.
+/// clocks forward by its whole time and returns ETIMEDOUT. In between, the clocks run on as usual. At the end
+/// BSS1_GetTime is back at the real time; BSS1_GetElapsed, which never steps back, keeps its lead.
 class TEST_RecordedSleeps {
  public:
   TEST_RecordedSleeps();
@@ -43,14 +44,16 @@ class TEST_RecordedSleeps {
   TEST_RecordedSleeps(const TEST_RecordedSleeps&) = delete;
   TEST_RecordedSleeps& operator=(const TEST_RecordedSleeps&) = delete;
 
-  [[nodiscard]] std::vector<unsigned> seconds() const;         ///< of each BSS1_Sleep, in order
+  [[nodiscard]] std::vector<unsigned> seconds() const;            ///< of each BSS1_Sleep, in order
   [[nodiscard]] std::vector<int64_t> waitedMilliseconds() const;  ///< of each BSS1_TimedWait that timed out
 };
 
 /// Makes one call of a service fail: the n-th from now on (n = 1: the next). Services are named like their functions,
-/// "FSI1_NewList"; the result is the given status (a null result for those that return pointers, 0 for XML1_ParseBuffer).
-/// Those that can fail so: BSS1_GetEnv (its default), BSS1_PutEnv, BSS1_GetLock, BSS1_ReleaseLock, FSI1_*, XML1_ParserCreate,
-/// XML1_GetBuffer, XML1_ParseBuffer, NLS2_GetLocale, RegisterWithManager, InsertRow, Dispatch.
+/// "FSI1_NewList"; the result is the given status (a null result for those that return pointers, 0 for
+/// XML1_ParseBuffer). Those that can fail so: BSS1_GetEnv (its default), BSS1_PutEnv, BSS1_GetLock, BSS1_ReleaseLock,
+/// FSI1_*, XML1_ParserCreate, XML1_GetBuffer, XML1_ParseBuffer (XML1_GetErrorCode then gives the status),
+/// NLS2_GetLocale, RegisterWithManager, InsertRow, Dispatch. What gives something back (BSS1_ReleaseLock,
+/// FSI1_DeleteList) has done so, and so has Dispatch: the rows that waited are gone.
 class TEST_FailCall {
  public:
   TEST_FailCall(const std::string& service, unsigned n, int status);

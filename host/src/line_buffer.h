@@ -16,7 +16,7 @@ class LineBuffer {
   /// Appends a formatted text; what there is no memory for is cut off. A format that the C library refuses is appended
   /// as it stands.
   [[gnu::format(printf, 2, 3)]] void append(const char* format, ...);
-  void append(const char* format, va_list arguments);
+  [[gnu::format(printf, 2, 0)]] void append(const char* format, va_list arguments);
 
   /// Drops one line feed at the end of what follows `position`; each other control byte there becomes visible.
   void makeOneLine(size_t position);

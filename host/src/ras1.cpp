@@ -42,8 +42,8 @@ void appendTime(LineBuffer& line, const timespec& time) {
               static_cast<int>(clock.seconds().count()), time.tv_nsec / 1000);
 }
 
-void printLine(const RAS1_Unit& unit, RAS1_Level level, int number, const char* function, const char* format,
-               va_list arguments) {
+[[gnu::format(printf, 5, 0)]] void printLine(const RAS1_Unit& unit, RAS1_Level level, int number, const char* function,
+                                             const char* format, va_list arguments) {
   timespec time{};
   (void)clock_gettime(CLOCK_REALTIME, &time);  // cannot fail for this clock
   LineBuffer line;

@@ -14,7 +14,8 @@ namespace vmqhost::seam {
 extern constinit std::atomic<bool> captureActive;
 
 /// Keeps a line when a capture is active.
-void captureLine(const RAS1_Unit& unit, RAS1_Level level, const char* function, const char* format, va_list arguments);
+[[gnu::format(printf, 4, 0)]] void captureLine(const RAS1_Unit& unit, RAS1_Level level, const char* function,
+                                               const char* format, va_list arguments);
 
 // ---- passing of time -------------------------------------------------------------------------------------------
 

@@ -47,7 +47,7 @@ void moveClocks(int64_t milliseconds) {
   elapsedClockAhead.fetch_add(milliseconds, std::memory_order_relaxed);
 }
 
-std::string formatted(const char* format, va_list arguments) {
+[[gnu::format(printf, 1, 0)]] std::string formatted(const char* format, va_list arguments) {
   char* text = nullptr;
   const int length = vasprintf(&text, format, arguments);
   if (length < 0) return format;
