@@ -7,6 +7,8 @@
 //   const Trace trace(traceUnit);
 //   TRACE_DETAIL(trace, "Path [%s] exists", path.c_str().get());
 
+#include <cerrno>
+
 #include "ras1.h"
 
 namespace VMQ {
@@ -18,7 +20,10 @@ class Trace {
     if (RAS1_Enabled(unit_, RAS1_EVENT)) RAS1_Event(&unit_, RAS1_ENTRY, line_, function_);
   }
   ~Trace() {
-    if (RAS1_Enabled(unit_, RAS1_EVENT)) RAS1_Event(&unit_, RAS1_EXIT, line_, function_);
+    if (!RAS1_Enabled(unit_, RAS1_EVENT)) return;
+    const int error = errno;  // the result of many a routine
+    RAS1_Event(&unit_, RAS1_EXIT, line_, function_);
+    errno = error;
   }
   Trace(const Trace&) = delete;
   Trace& operator=(const Trace&) = delete;

@@ -1,0 +1,210 @@
+#include "tests/process/system_faults.h"
+
+#include <poll.h>
+#include <pthread.h>
+#include <sched.h>
+#include <signal.h>
+#include <sys/eventfd.h>
+#include <sys/mman.h>
+#include <sys/syscall.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <atomic>
+#include <cerrno>
+#include <cstdarg>
+#include <cstdint>
+#include <mutex>
+
+// The faults of dup3 and close_range strike in a child that shares our memory: see process/child_entry.cpp.
+#if defined(__clang__)
+#define CHILD_CODE __attribute__((disable_sanitizer_instrumentation))
+#else
+#define CHILD_CODE __attribute__((no_sanitize("address", "thread", "undefined")))
+#endif
+
+namespace {
+
+struct Plan {
+  int first = 0;  ///< the calls from `first` to below `end` fail; none when `end` is 0
+  int end = 0;
+  int error = 0;
+  int calls = 0;
+};
+Plan plans[static_cast<int>(SystemCall::kCount)];
+
+/// The error of this call, or 0 when it is not to fail.
+CHILD_CODE int strike(SystemCall call) {
+  Plan& plan = plans[static_cast<int>(call)];
+  if (__atomic_load_n(&plan.end, __ATOMIC_ACQUIRE) == 0) return 0;
+  const int number = __atomic_add_fetch(&plan.calls, 1, __ATOMIC_ACQ_REL);
+  return number >= plan.first && number < plan.end ? plan.error : 0;
+}
+
+/// For the functions that set errno.
+template <typename Real, typename Result>
+Result orErrno(SystemCall call, Result failure, Real real) {
+  const int error = strike(call);
+  if (error == 0) return real();
+  errno = error;
+  return failure;
+}
+
+std::atomic<pthread_mutex_t*> lastMutex;
+
+std::mutex& killMutex = *new std::mutex;
+std::vector<std::pair<pid_t, int>>* recordedKills = nullptr;  // guarded by killMutex
+
+}  // namespace
+
+SystemFault::SystemFault(SystemCall call, int error, int nth, int times) : call_(call) {
+  Plan& plan = plans[static_cast<int>(call)];
+  plan.first = nth;
+  plan.error = error;
+  __atomic_store_n(&plan.calls, 0, __ATOMIC_RELAXED);
+  __atomic_store_n(&plan.end, nth + times, __ATOMIC_RELEASE);
+}
+
+SystemFault::~SystemFault() {
+  __atomic_store_n(&plans[static_cast<int>(call_)].end, 0, __ATOMIC_RELEASE);
+}
+
+bool SystemFault::happened() const {
+  const Plan& plan = plans[static_cast<int>(call_)];
+  return __atomic_load_n(&plan.calls, __ATOMIC_ACQUIRE) >= plan.first;
+}
+
+KillRecord::KillRecord() {
+  const std::lock_guard lock(killMutex);
+  recordedKills = new std::vector<std::pair<pid_t, int>>;
+}
+
+KillRecord::~KillRecord() {
+  const std::lock_guard lock(killMutex);
+  delete recordedKills;
+  recordedKills = nullptr;
+}
+
+std::vector<std::pair<pid_t, int>> KillRecord::kills() const {
+  const std::lock_guard lock(killMutex);
+  return *recordedKills;
+}
+
+extern "C" {
+
+// What the linker's --wrap makes of each function: the real one, and the one that is called.
+#define WRAP(result, name, ...)      \
+  result __real_##name(__VA_ARGS__); \
+  result __wrap_##name(__VA_ARGS__)
+
+WRAP(int, pipe2, int ends[2], int flags) {
+  return orErrno(SystemCall::kPipe2, -1, [&] { return __real_pipe2(ends, flags); });
+}
+
+WRAP(void*, mmap, void* address, size_t length, int protection, int flags, int descriptor, off_t offset) {
+  return orErrno(SystemCall::kMmap, MAP_FAILED,
+                 [&] { return __real_mmap(address, length, protection, flags, descriptor, offset); });
+}
+
+WRAP(int, clone, int (*entry)(void*), void* stack, int flags, void* argument, ...) {
+  return orErrno(SystemCall::kClone, -1, [&] { return __real_clone(entry, stack, flags, argument); });
+}
+
+WRAP(int, eventfd, unsigned initial, int flags) {
+  return orErrno(SystemCall::kEventfd, -1, [&] { return __real_eventfd(initial, flags); });
+}
+
+WRAP(int, pthread_create, pthread_t* thread, const pthread_attr_t* attributes, void* (*entry)(void*), void* argument) {
+  const int error = strike(SystemCall::kPthreadCreate);
+  return error != 0 ? error : __real_pthread_create(thread, attributes, entry, argument);
+}
+
+WRAP(int, pthread_mutex_init, pthread_mutex_t* mutex, const pthread_mutexattr_t* attributes) {
+  lastMutex = mutex;
+  const int error = strike(SystemCall::kPthreadMutexInit);
+  return error != 0 ? error : __real_pthread_mutex_init(mutex, attributes);
+}
+
+WRAP(int, pthread_cond_init, pthread_cond_t* condition, const pthread_condattr_t* attributes) {
+  const int error = strike(SystemCall::kPthreadCondInit);
+  return error != 0 ? error : __real_pthread_cond_init(condition, attributes);
+}
+
+WRAP(int, pthread_mutex_lock, pthread_mutex_t* mutex) {
+  const int error = mutex == lastMutex ? strike(SystemCall::kPthreadMutexLock) : 0;
+  return error != 0 ? error : __real_pthread_mutex_lock(mutex);
+}
+
+WRAP(int, pthread_mutex_unlock, pthread_mutex_t* mutex) {
+  const int error = mutex == lastMutex ? strike(SystemCall::kPthreadMutexUnlock) : 0;
+  const int rc = __real_pthread_mutex_unlock(mutex);
+  return error != 0 ? error : rc;
+}
+
+WRAP(int, pthread_cond_signal, pthread_cond_t* condition) {
+  const int error = strike(SystemCall::kPthreadCondSignal);
+  const int rc = __real_pthread_cond_signal(condition);
+  return error != 0 ? error : rc;
+}
+
+WRAP(int, kill, pid_t target, int signal) {
+  {
+    const std::lock_guard lock(killMutex);
+    if (recordedKills != nullptr) recordedKills->emplace_back(target, signal);
+  }
+  return orErrno(SystemCall::kKill, -1, [&] { return __real_kill(target, signal); });
+}
+
+WRAP(int, waitid, idtype_t type, id_t id, siginfo_t* info, int options) {
+  return orErrno(SystemCall::kWaitid, -1, [&] { return __real_waitid(type, id, info, options); });
+}
+
+WRAP(pid_t, waitpid, pid_t pid, int* status, int options) {
+  return orErrno(SystemCall::kWaitpid, -1, [&] { return __real_waitpid(pid, status, options); });
+}
+
+WRAP(int, poll, pollfd* events, nfds_t count, int timeout) {
+  return orErrno(SystemCall::kPoll, -1, [&] { return __real_poll(events, count, timeout); });
+}
+
+WRAP(ssize_t, read, int descriptor, void* buffer, size_t length) {
+  return orErrno(SystemCall::kRead, ssize_t{-1}, [&] { return __real_read(descriptor, buffer, length); });
+}
+
+WRAP(ssize_t, write, int descriptor, const void* buffer, size_t length) {
+  return orErrno(SystemCall::kWrite, ssize_t{-1}, [&] { return __real_write(descriptor, buffer, length); });
+}
+
+WRAP(int, fcntl, int descriptor, int command, ...) {
+  va_list arguments;
+  va_start(arguments, command);
+  const long argument = va_arg(arguments, long);
+  va_end(arguments);
+  return orErrno(SystemCall::kFcntl, -1, [&] { return __real_fcntl(descriptor, command, argument); });
+}
+
+WRAP(char*, strdup, const char* text) {
+  return orErrno(SystemCall::kStrdup, static_cast<char*>(nullptr), [&] { return __real_strdup(text); });
+}
+
+WRAP(int, BSS1_TimedWait, pthread_cond_t* condition, pthread_mutex_t* mutex, int64_t milliseconds) {
+  const int error = strike(SystemCall::kTimedWait);
+  return error != 0 ? error : __real_BSS1_TimedWait(condition, mutex, milliseconds);
+}
+
+long __real_syscall(long number, ...);
+CHILD_CODE long __wrap_syscall(long number, ...) {
+  va_list arguments;
+  va_start(arguments, number);
+  long a[6];
+  for (long& argument : a) argument = va_arg(arguments, long);
+  va_end(arguments);
+  const int error = number == SYS_dup3          ? strike(SystemCall::kDup3)
+                    : number == SYS_close_range ? strike(SystemCall::kCloseRange)
+                                                : 0;
+  if (error == 0) return __real_syscall(number, a[0], a[1], a[2], a[3], a[4], a[5]);
+  errno = error;
+  return -1;
+}
+
+}  // extern "C"
