@@ -1,0 +1,1 @@
+vmq_bench(queue_bench SOURCES queue_bench.cpp)
