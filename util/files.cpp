@@ -8,6 +8,7 @@
 #include <cstring>
 #include <filesystem>
 #include <memory>
+#include <new>
 #include <string>
 #include <system_error>
 
@@ -179,11 +180,13 @@ int Util::createDir(char* path) {
   for (const char* slash = std::strchr(name, '/'); slash != nullptr && slash[1] != '\0';
        slash = std::strchr(slash + 1, '/')) {
     const auto length = static_cast<size_t>(slash - path);
-    const Buffer prefix(strndup(path, length));
+    const std::unique_ptr<char[]> prefix(new (std::nothrow) char[length + 1]);
     if (!prefix) {
       TRACE_ERROR(trace, "Malloc of %d bytes failed", static_cast<int>(length + 1));
       return ENOMEM;
     }
+    std::memcpy(prefix.get(), path, length);
+    prefix[length] = '\0';
     if (const int error = makeDirectory(trace, prefix.get(), "Making directory"); error != 0) return error;
   }
   return makeDirectory(trace, path, "Making final directory");

@@ -25,7 +25,7 @@ class DOMElement;
 class StartupDB {
  public:
   /// Reads the file. When it is missing, unreadable or not well-formed XML the database is empty; failures are traced.
-  /// An element without its productCode is dropped; the order of elements, blanks around texts and unknown elements do
+  /// An agent without its productCode is dropped; the order of elements, blanks around texts and unknown elements do
   /// not matter, nor does the root's name. Kept on purpose: the user of an instance that has no name is not read.
   explicit StartupDB(const String& fileName);
   /// Copies every agent.
@@ -39,7 +39,7 @@ class StartupDB {
   /// cannot be read back ("<" or "&", or anything else the parser rejects, such as bytes that are not UTF-8). The file
   /// is replaced in one step and keeps its mode and owner: what goes wrong once it is open (a full disk) is traced,
   /// leaves the earlier contents whole, and, kept on purpose, still returns true.
-  bool save();
+  bool save() const;
 
   /// Takes ownership. Product codes may repeat; lookups find the first.
   void addAgent(AgentEntry* agent);
