@@ -107,8 +107,6 @@ TEST(EntryPoint, GoesOnAfterAFailedRegistration) {
 }
 
 void startWithoutMemoryForAManager() {
-  const InstallationHome home;
-  TEST_TraceCapture trace;
   {
     const FailingAllocation failing(sizeof(vmq_kagreqt_manager));
     EXPECT_EQ(vmq_kagreqt_init(), 0x21060002u);

@@ -29,6 +29,7 @@ class StatusTable : public testing::Test {
   }
   InstallationHome& home = runningComponent();
   TEST_RecordedSleeps sleeps;
+  TEST_TraceCapture trace;  // keeps the output quiet
 };
 
 TEST_F(StatusTable, SamplingGivesNothingEvenRightAfterATaskHasEnded) {
