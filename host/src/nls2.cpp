@@ -30,9 +30,11 @@ struct CodePage {
   uint32_t maximumBytesPerUnit;
 };
 
+/// 943 goes by the table of 932, which has all its characters: the C library's own table for 943 exchanges some control
+/// characters, which no text here means.
 constexpr CodePage kCodePages[] = {
     {NLS2_CP_ASCII, nullptr, 1}, {NLS2_CP_LATIN1, nullptr, 1}, {NLS2_CP_UTF8, nullptr, 3},
-    {NLS2_CP932, "CP932", 2},    {NLS2_CP943, "IBM943", 2},    {NLS2_CP_EUCJP, "EUC-JP", 3},
+    {NLS2_CP932, "CP932", 2},    {NLS2_CP943, "CP932", 2},     {NLS2_CP_EUCJP, "EUC-JP", 3},
 };
 
 /// What nl_langinfo calls them.

@@ -74,7 +74,7 @@ class IconvConverter : public Converter {
 
   Converted toUnits(const unsigned char* bytes, size_t count, Unit* units, size_t capacity) const override {
     const size_t run = ascii_is_ascii_ ? widenAscii(bytes, std::min(count, capacity), units) : 0;
-    if (run == count) return {run, false};
+    if (run == count || run == capacity) return {run, run < count};  // iconv takes no empty output
     const std::lock_guard held(mutex_);
     const Converted rest = decoder_.convert(bytes + run, count - run, units + run, capacity - run,
                                             [](unsigned char byte) { return static_cast<Unit>(byte); });
@@ -83,7 +83,7 @@ class IconvConverter : public Converter {
 
   Converted fromUnits(const Unit* units, size_t count, unsigned char* bytes, size_t capacity) const override {
     const size_t run = ascii_is_ascii_ ? narrowAscii(units, std::min(count, capacity), bytes) : 0;
-    if (run == count) return {run, false};
+    if (run == count || run == capacity) return {run, run < count};  // iconv takes no empty output
     const std::lock_guard held(mutex_);
     const Converted rest = encoder_.convert(units + run, count - run, bytes + run, capacity - run, byteForUnit);
     return {run + rest.stored, rest.cut};

@@ -18,6 +18,8 @@ struct XML1_Parser {
   int depth = 0;
   bool stopped = false;  // expat may still call after XML_StopParser; the handlers must not hear of it
   int error = 0;
+  unsigned long line = 0;  // of the event at which it was stopped: expat's own position moves past it
+  unsigned long column = 0;
 };
 
 namespace {
@@ -29,6 +31,8 @@ namespace {
 void stop(XML1_Parser& parser, int error) {
   parser.stopped = true;
   parser.error = error;
+  parser.line = XML_GetCurrentLineNumber(parser.expat);
+  parser.column = XML_GetCurrentColumnNumber(parser.expat);
   (void)XML_StopParser(parser.expat, XML_FALSE);  // fails only when the parse is over anyway
 }
 
@@ -131,9 +135,11 @@ const char* XML1_ErrorString(int code) {
 }
 
 unsigned long XML1_GetCurrentLineNumber(XML1_Parser* parser) {
-  return parser == nullptr ? 0 : XML_GetCurrentLineNumber(parser->expat);
+  if (parser == nullptr) return 0;
+  return parser->stopped ? parser->line : XML_GetCurrentLineNumber(parser->expat);
 }
 
 unsigned long XML1_GetCurrentColumnNumber(XML1_Parser* parser) {
-  return parser == nullptr ? 0 : XML_GetCurrentColumnNumber(parser->expat);
+  if (parser == nullptr) return 0;
+  return parser->stopped ? parser->column : XML_GetCurrentColumnNumber(parser->expat);
 }
