@@ -1,0 +1,156 @@
+// One client's connection, and the request that is on it.
+
+#include "apps/vmqd/http_connection.h"
+
+#include <charconv>
+#include <memory>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include "apps/vmqd/log.h"
+
+namespace vmqd {
+namespace {
+
+constexpr size_t streamBlockBytes = 8192;
+constexpr size_t keptBufferBytes = 64 * 1024;  // of each buffer, from one request to the next
+
+struct DestroyResponse {
+  void operator()(MHD_Response* response) const { MHD_destroy_response(response); }
+};
+using Response = std::unique_ptr<MHD_Response, DestroyResponse>;
+
+ssize_t readStream(void* stream, uint64_t, char* buffer, size_t capacity) try {
+  const size_t count = static_cast<ReplyStream*>(stream)->read(buffer, capacity);
+  return count == 0 ? static_cast<ssize_t>(MHD_CONTENT_READER_END_OF_STREAM) : static_cast<ssize_t>(count);
+} catch (const std::exception&) {
+  return MHD_CONTENT_READER_END_WITH_ERROR;
+}
+
+void freeStream(void* stream) {
+  delete static_cast<ReplyStream*>(stream);
+}
+
+Response newResponse(Reply& reply) {
+  if (!reply.stream) {
+    // The text stays where it is until the reply has been sent.
+    return Response(MHD_create_response_from_buffer(reply.text.size(), reply.text.data(), MHD_RESPMEM_PERSISTENT));
+  }
+  Response response(MHD_create_response_from_callback(MHD_SIZE_UNKNOWN, streamBlockBytes, readStream,
+                                                      reply.stream.get(), freeStream));
+  if (response) (void)reply.stream.release();  // freeStream has it now
+  return response;
+}
+
+bool addHeader(const Response& response, const char* name, const char* value) {
+  return MHD_add_response_header(response.get(), name, value) == MHD_YES;
+}
+
+MHD_Result collectArgument(void* arguments, MHD_ValueKind, const char* name, size_t name_bytes, const char* value,
+                           size_t value_bytes) try {
+  // An argument without "=" has no value at all.
+  static_cast<std::vector<Argument>*>(arguments)->push_back(
+      {{name, name_bytes}, value == nullptr ? std::string_view() : std::string_view(value, value_bytes)});
+  return MHD_YES;
+} catch (const std::bad_alloc&) {
+  return MHD_NO;
+}
+
+void trim(std::string& buffer) {
+  if (buffer.capacity() > keptBufferBytes) std::string().swap(buffer);
+}
+
+}  // namespace
+
+HttpConnection::HttpConnection(HttpServer& server, MHD_Connection* connection)
+    : server_(server), connection_(connection) {
+  server_.connections_.begin();
+  one_too_many_ = server_.connections_.count() > server_.limits_.maximum_connections;
+  const auto* const info = MHD_get_connection_info(connection_, MHD_CONNECTION_INFO_CONNECTION_FD);
+  if (info != nullptr) descriptor_ = info->connect_fd;
+  const auto peer = peerOf(descriptor_);
+  admitted_ = peer && server_.users_.admits(peer->uid);
+  if (!peer) {
+    logWarning("refused a client whose user the system does not tell");
+  } else if (!admitted_) {
+    logWarning("refused the user " + std::to_string(peer->uid) + ", process " + std::to_string(peer->pid));
+  }
+}
+
+HttpConnection::~HttpConnection() {
+  server_.connections_.end();
+}
+
+MHD_Result HttpConnection::begin() {
+  body_.clear();
+  body_bytes_ = 0;
+  if (!admitted_) return refuseNow(errors::notAllowed, "The daemon does not admit your user.");
+  if (one_too_many_) {
+    return refuseNow(errors::busy,
+                     "There are already " + std::to_string(server_.limits_.maximum_connections) + " connections.");
+  }
+  const char* const length = MHD_lookup_connection_value(connection_, MHD_HEADER_KIND, MHD_HTTP_HEADER_CONTENT_LENGTH);
+  if (length == nullptr) return MHD_YES;
+  const std::string_view digits(length);
+  uint64_t bytes = UINT64_MAX;  // also what a number that is too large for 64 bits leaves
+  (void)std::from_chars(digits.data(), digits.data() + digits.size(), bytes);
+  return bytes > server_.limits_.maximum_request_bytes ? bodyTooLarge() : MHD_YES;
+}
+
+MHD_Result HttpConnection::takeBody(const char* piece, size_t bytes) {
+  body_bytes_ += bytes;
+  const size_t maximum = server_.limits_.maximum_request_bytes;
+  // A body of unannounced length can be refused in words only once it has ended, but it need not end.
+  if (body_bytes_ > 16 * maximum) return MHD_NO;
+  if (body_bytes_ <= maximum) body_.append(piece, bytes);
+  return MHD_YES;
+}
+
+MHD_Result HttpConnection::answer(const char* method, const char* path) {
+  if (body_bytes_ > server_.limits_.maximum_request_bytes) return bodyTooLarge();
+  Request request{method, path, {}, {}, body_, descriptor_};
+  (void)MHD_get_connection_values_n(connection_, MHD_GET_ARGUMENT_KIND, collectArgument, &request.arguments);
+  server_.unfinished_.begin();
+  unfinished_ = true;
+  Reply reply(reply_);
+  {
+    const Activity::Scope working(server_.working_);
+    server_.answer_(request, reply);
+  }
+  return send(reply, false);
+}
+
+void HttpConnection::end() {
+  trim(body_);
+  trim(reply_);
+  if (std::exchange(unfinished_, false)) server_.unfinished_.end();
+}
+
+MHD_Result HttpConnection::bodyTooLarge() {
+  return refuseNow(errors::bodyTooLarge,
+                   "The body is larger than " + std::to_string(server_.limits_.maximum_request_bytes) + " bytes.");
+}
+
+/// The connection ends with the reply: a body that may still be coming is not read.
+MHD_Result HttpConnection::refuseNow(const ErrorCode& code, const std::string& sentence) {
+  Reply reply(reply_);
+  refuse(reply, code, sentence);
+  return send(reply, true);
+}
+
+MHD_Result HttpConnection::send(Reply& reply, bool last) {
+  const unsigned status = reply.status;
+  const bool is_stream = reply.stream != nullptr;
+  const Response response = newResponse(reply);
+  if (!response ||
+      !addHeader(response, MHD_HTTP_HEADER_CONTENT_TYPE, is_stream ? "text/event-stream" : "application/json") ||
+      (is_stream && !addHeader(response, MHD_HTTP_HEADER_CACHE_CONTROL, "no-cache")) ||
+      (!reply.allow.empty() && !addHeader(response, MHD_HTTP_HEADER_ALLOW, reply.allow.c_str())) ||
+      (last && !addHeader(response, MHD_HTTP_HEADER_CONNECTION, "close"))) {
+    return MHD_NO;
+  }
+  return MHD_queue_response(connection_, status, response.get());
+}
+
+}  // namespace vmqd

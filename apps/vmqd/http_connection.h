@@ -1,0 +1,45 @@
+#pragma once
+// One client's connection, and the request that is on it.
+
+#include <microhttpd.h>
+
+#include <cstddef>
+#include <string>
+
+#include "apps/vmqd/http_server.h"
+#include "apps/vmqd/refusal.h"
+
+namespace vmqd {
+
+/// Its buffers stay from request to request. One thread at a time: that of the connection.
+class HttpConnection {
+ public:
+  /// `connection` was accepted just now.
+  HttpConnection(HttpServer& server, MHD_Connection* connection);
+  ~HttpConnection();
+  HttpConnection(const HttpConnection&) = delete;
+  HttpConnection& operator=(const HttpConnection&) = delete;
+
+  // The steps of a request. The result is for the HTTP library: MHD_NO closes the connection.
+  MHD_Result begin();                                       ///< its header has arrived
+  MHD_Result takeBody(const char* piece, size_t bytes);     ///< a piece of its body has
+  MHD_Result answer(const char* method, const char* path);  ///< all of it has
+  void end();                                               ///< its reply has been sent, or cannot be
+
+ private:
+  MHD_Result refuseNow(const ErrorCode& code, const std::string& sentence);
+  MHD_Result bodyTooLarge();
+  MHD_Result send(Reply& reply, bool last);
+
+  HttpServer& server_;
+  MHD_Connection* const connection_;
+  int descriptor_ = -1;
+  bool admitted_ = false;
+  bool one_too_many_ = false;
+  bool unfinished_ = false;
+  size_t body_bytes_ = 0;  // of those that came; body_ keeps no more than are allowed
+  std::string body_;
+  std::string reply_;
+};
+
+}  // namespace vmqd

@@ -1,0 +1,138 @@
+// vmqd: the process that the component runs in.
+
+#include <limits.h>
+#include <signal.h>
+#include <sys/eventfd.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cstring>
+#include <exception>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+#include "apps/vmqd/command_line.h"
+#include "apps/vmqd/component_loader.h"
+#include "apps/vmqd/config.h"
+#include "apps/vmqd/environment.h"
+#include "apps/vmqd/file_systems.h"
+#include "apps/vmqd/http_server.h"
+#include "apps/vmqd/listening_socket.h"
+#include "apps/vmqd/log.h"
+#include "apps/vmqd/notify.h"
+#include "apps/vmqd/routes.h"
+#include "apps/vmqd/service.h"
+
+namespace {
+
+using namespace vmqd;
+
+/// Blocked, not ignored: children inherit what is ignored. Threads inherit what is blocked. SIGPIPE: a client or a
+/// service manager that has gone must not end the daemon.
+sigset_t blockSignals() {
+  sigset_t ending;
+  sigemptyset(&ending);
+  sigaddset(&ending, SIGTERM);
+  sigaddset(&ending, SIGINT);
+  sigset_t blocked = ending;
+  sigaddset(&blocked, SIGPIPE);
+  if (const int error = pthread_sigmask(SIG_BLOCK, &blocked, nullptr))
+    throw std::runtime_error(withReason("signals", error));
+  return ending;
+}
+
+const char* waitForEnding(const sigset_t& ending) {
+  int signal;
+  while (true) {
+    if (sigwait(&ending, &signal) == 0) return signal == SIGTERM ? "SIGTERM" : "SIGINT";
+  }
+}
+
+std::string hostName() {
+  char name[HOST_NAME_MAX + 1] = "";
+  if (gethostname(name, sizeof name) != 0) throw std::runtime_error(withReason("the host has no name", errno));
+  return name;
+}
+
+/// The users that the mode of the socket keeps out.
+std::vector<uid_t> guestsOf(const Configuration& configuration) {
+  std::vector<uid_t> guests = configuration.allowed_uids;
+  guests.erase(std::remove_if(guests.begin(), guests.end(), [](uid_t user) { return user == 0 || user == geteuid(); }),
+               guests.end());
+  return guests;
+}
+
+void warn(const Service& service) {
+  const std::string& depot = service.settings.depot;
+  if (!depot.empty() && onDifferentFileSystems(depot, service.settings.home)) {
+    logWarning("the depot " + depot + " and the home " + service.settings.home +
+               " are on different file systems: files that are pushed with a conversion of line ends will fail");
+  }
+  if (service.tables.empty()) logWarning("the component has registered no tables");
+}
+
+void tell(const ServiceManager& manager, const char* state) {
+  if (const int error = manager.notify(state)) logWarning(withReason("the service manager", error));
+}
+
+int run(const Configuration& configuration) {
+  const sigset_t ending = blockSignals();
+  const ServiceManager manager;
+  ListeningSocket socket(configuration.socket, guestsOf(configuration));
+  const Descriptor stop(eventfd(0, EFD_CLOEXEC));
+  if (!stop) throw std::runtime_error(withReason("no event descriptor", errno));
+
+  ServiceSettings settings;
+  settings.node = configuration.node.empty() ? hostName() : configuration.node;
+  settings.event_buffer_rows = configuration.event_buffer_rows;
+  settings.maximum_watchers = configuration.maximum_connections / 4 * 3;
+  settings.stop = stop.get();
+
+  applyEnvironment(configuration);
+  settings.home = configuration.home;
+  settings.depot = environmentValue("QORDEPLOY_AGENTDEPOT");
+  vmqhost::setOriginNode(settings.node);
+  loadComponent(configuration.library.empty() ? defaultLibrary() : configuration.library);
+
+  Service service(settings, vmqhost::listTables());
+  warn(service);
+  HttpServer server(socket, AdmittedUsers(configuration.allowed_uids),
+                    {configuration.maximum_request_bytes, configuration.maximum_connections},
+                    [&service](Request& request, Reply& reply) { answer(service, request, reply); });
+  logLine("version " VMQ_VERSION " listening on " + socket.path());
+  tell(manager, "READY=1");
+
+  logLine(std::string("stopping: ") + waitForEnding(ending));
+  tell(manager, "STOPPING=1");
+  (void)eventfd_write(stop.get(), 1);
+  if (server.stop(std::chrono::seconds(configuration.stop_seconds))) {
+    logLine("stopped");
+    return 0;
+  }
+  logWarning("stopped without waiting for " + std::to_string(server.working()) + " queries that still run");
+  socket.remove();
+  _exit(0);
+}
+
+}  // namespace
+
+int main(int count, char** arguments) {
+  int exit_code = 0;
+  const auto options = readCommandLine(count, arguments, &exit_code);
+  if (!options) return exit_code;
+  try {
+    const Configuration configuration = readConfiguration(options->config);
+    if (!options->check) return run(configuration);
+    checkEnvironment(configuration);
+    logLine(options->config + " is in order");
+    return 0;
+  } catch (const ConfigurationError& error) {
+    logError(error.what());
+    return exitUsage;
+  } catch (const std::exception& error) {
+    logError(error.what());
+    return 1;
+  }
+}

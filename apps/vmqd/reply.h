@@ -1,0 +1,44 @@
+#pragma once
+// What a route is asked and what it answers, whatever carries it.
+
+#include <cstddef>
+#include <memory>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace vmqd {
+
+struct Argument {
+  std::string_view name;
+  std::string_view value;
+};
+
+/// Valid while it is being answered.
+struct Request {
+  std::string_view method;
+  std::string_view path;
+  std::string_view parameter;       ///< what stands in the path where the route has a "{...}"
+  std::vector<Argument> arguments;  ///< of the query string, decoded, in the order sent
+  std::string_view body;
+  int client = -1;  ///< descriptor of the connection
+};
+
+/// A reply without a known end.
+class ReplyStream {
+ public:
+  virtual ~ReplyStream() = default;
+  /// Waits until there is something, and stores at most `capacity` bytes of it. Returns how many, 0 at the end.
+  virtual size_t read(char* buffer, size_t capacity) = 0;
+};
+
+struct Reply {
+  explicit Reply(std::string& reused) : text(reused) { text.clear(); }
+
+  unsigned status = 200;
+  std::string& text;                    ///< JSON; in a buffer that the connection keeps
+  std::string allow;                    ///< methods, for 405
+  std::unique_ptr<ReplyStream> stream;  ///< if there is one, the text/event-stream that is sent instead of `text`
+};
+
+}  // namespace vmqd
