@@ -1,0 +1,16 @@
+#pragma once
+// Waiting for what another thread or process is about to do and gives no signal of.
+
+#include <chrono>
+#include <thread>
+
+/// Asks every millisecond. False when the answer is still no after ten seconds.
+template <typename Condition>
+bool eventually(Condition condition) {
+  const auto end = std::chrono::steady_clock::now() + std::chrono::seconds(10);
+  while (!condition()) {
+    if (std::chrono::steady_clock::now() > end) return false;
+    std::this_thread::sleep_for(std::chrono::milliseconds(1));
+  }
+  return true;
+}

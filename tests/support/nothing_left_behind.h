@@ -1,0 +1,16 @@
+#pragma once
+// Fails the running test when what happened in a block has left descriptors, threads or children.
+
+#include "tests/support/process_resources.h"
+
+class NothingLeftBehind {
+ public:
+  NothingLeftBehind() = default;
+  /// Gives threads and children that are about to end a few seconds for it.
+  ~NothingLeftBehind();
+  NothingLeftBehind(const NothingLeftBehind&) = delete;
+  NothingLeftBehind& operator=(const NothingLeftBehind&) = delete;
+
+ private:
+  const ProcessResources before_ = ProcessResources::now();
+};
