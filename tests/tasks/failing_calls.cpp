@@ -27,9 +27,11 @@ FailingCalls::~FailingCalls() {
   calls = nullptr;
 }
 
+// The names are the linker's: what the component calls, and what it would have called. Visible, because the linker asks
+// for that when a shared library (such as a sanitizer's) calls the same functions.
+#pragma GCC visibility push(default)
 extern "C" {
 
-// The names are the linker's: what the component calls, and what it would have called.
 int __real_pthread_mutex_init(pthread_mutex_t*, const pthread_mutexattr_t*);
 int __real_pthread_cond_init(pthread_cond_t*, const pthread_condattr_t*);
 int __real_pthread_create(pthread_t*, const pthread_attr_t*, void* (*)(void*), void*);
@@ -87,6 +89,7 @@ int __wrap_pthread_cond_wait(pthread_cond_t* condition, pthread_mutex_t* mutex) 
 }
 
 }  // extern "C"
+#pragma GCC visibility pop
 
 bool queueMutexIsHeld() {
   const int status = pthread_mutex_trylock(&queue_mutex);
