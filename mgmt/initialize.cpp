@@ -31,7 +31,7 @@ void attempt(const Trace& trace, const char* activity, Step step) {
 
 /// Chooses the text conversions' locale while there is one thread only; later conversions just read it.
 void convertFirstText() {
-  VMQ::String::initialize();
+  (void)VMQ::String("first").c_str();
 }
 
 }  // namespace

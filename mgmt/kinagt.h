@@ -34,7 +34,7 @@ class vmq_kinagt_agent : public vmq_kinagt_base {
   ~vmq_kinagt_agent() override { TakeSampleDestructor(); }
 
   void TakeSampleConstructor();
-  /// Gives no rows yet: the inventory tool is not asked so far.
+  /// Asks the installation's tools and gives the products they name. Runs children: may take long.
   void TakeSample() override;
   void TakeSampleDestructor();
 };

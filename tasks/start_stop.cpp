@@ -5,6 +5,7 @@
 #include <cstring>
 
 #include "bss1.h"
+#include "tasks/command_report.h"
 #include "util/corvel_home.h"
 #include "util/startup_db.h"
 #include "util/trace.h"
@@ -42,11 +43,12 @@ String controlScriptCommand(const String& action, const String& productCode, con
   return command;
 }
 
-void setMessage(TaskQueueElem* request, TASK_RC rc, const String& command) {
-  if (request == nullptr) return;
-  request->retmsgid = String(rcToMsgId(rc));
-  request->retmsgparm = command;
-}
+constexpr CommandReport START_STOP_REPORT = {.not_started_rc = TASK_STARTSTOP_NOT_STARTED,
+                                             .not_started_text = "Failed to start command",
+                                             .failed_rc = TASK_STARTSTOP_FAILED,
+                                             .failed_text = "Bad return code from start/stop command",
+                                             .failed_source = nullptr,
+                                             .return_code = ReturnCodeForm::kAbsent};
 
 }  // namespace
 
@@ -85,19 +87,9 @@ TASK_RC startstopAgent(const String& action, const String& productCode, const St
     unsetEnv(hostName);
   }
 
-  int exitCode = 0;
-  String out;
-  String err;
-  TASK_RC rc = TASK_OK;
-  if (!VMQ::Util::runCommandEnv(command, environment, exitCode, out, err, String(""), /*nonBlocking=*/false)) {
-    rc = TASK_STARTSTOP_NOT_STARTED;
-    TRACE_ERROR(trace, "%s Failed to start command [%s]", rcToMsgId(rc), command.c_str().get());
-    setMessage(request, rc, command);
-  } else if (exitCode != 0) {
-    rc = TASK_STARTSTOP_FAILED;
-    TRACE_ERROR(trace, "%s Bad return code from start/stop command [%s]", rcToMsgId(rc), command.c_str().get());
-    setMessage(request, rc, command);
-  }
+  CommandOutput output;
+  const TASK_RC rc =
+      runAndReport(START_STOP_REPORT, command, String(""), /*nonBlocking=*/false, environment, request, output);
   TRACE_DETAIL(trace, "Exit with return code [%d]", rc);
   return rc;
 }

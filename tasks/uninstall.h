@@ -1,20 +1,18 @@
 #pragma once
-// UNINSTALL and REMOVEINSTANCE, and the placeholders of command lines that the management server sends.
+// UNINSTALL, REMOVEINSTANCE, and the placeholders of command lines that the management server sends.
 
 #include "tasks/task_queue_elem.h"
 #include "tasks/task_rc.h"
 #include "util/string.h"
 
-/// The text with "|DEPLOYDIR|", "|CORVELHOME|" and "|DEPOTDIR|" replaced.
-/// Not built yet: declared only.
+/// Replaces "|DEPLOYDIR|" (depot + product code, and "/" + version unless the product is "ci"), "|CORVELHOME|" and
+/// "|DEPOTDIR|", in this order; a replacement is not looked at again for the earlier ones.
 VMQ::String replaceTokens(const VMQ::String& text, const VMQ::String& productCode, const VMQ::String& version);
 
-/// Removes a product. 0, TASK_UNINSTALL_FAILED (1032), TASK_UNINSTALL_NOT_STARTED (1033) or
-/// TASK_NO_PRODUCT_ARCHITECTURE (1034). For the executor thread.
-/// Not built yet: always TASK_UNINSTALL_NOT_STARTED.
+/// Removes a product: with the installation's own script when the inventory knows it, else with the request's command.
+/// 0, 1032 (exited non-zero), 1033 (not started) or 1034 (no architecture). For the executor thread.
+/// Kept on purpose: the exit code in the message parameter is one character, not its digits.
 TASK_RC uninstall(TaskQueueElem& request);
 
-/// Removes one configured instance of a product. 0, TASK_NO_TRANSLATOR (1007), TASK_TRANSLATOR_FAILED (1008) or
-/// TASK_TRANSLATOR_NOT_STARTED (1009). For the executor thread.
-/// Not built yet: always TASK_TRANSLATOR_NOT_STARTED.
+/// Removes the instance TARGETMSN through the two-way translator, which reads CONTEXT. 0, 1007, 1008 or 1009.
 TASK_RC removeInstance(TaskQueueElem& request);
