@@ -92,9 +92,7 @@ void DOMParser::onCharacters(void* userData, const char* characters, int length)
   auto& self = *static_cast<DOMParser*>(userData);
   if (self.failed_) return;
   try {
-    String text;
-    text.assign(characters, static_cast<unsigned>(length));
-    self.pending_text_.append(text);
+    self.pending_text_.append(characters, static_cast<size_t>(length));
   } catch (...) {
     traceCurrentException(trace, "gathering text");
     self.failed_ = true;
@@ -117,7 +115,7 @@ void DOMParser::startElement(const char* name, const char** attributes) {
 
 void DOMParser::endElement() {
   if (current_ == nullptr) return;
-  current_->setElementText(pending_text_.getData());
+  current_->setElementText(pending_text_.c_str());
   current_ = current_->getParent();
   pending_text_.clear();
 }

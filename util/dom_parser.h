@@ -1,8 +1,9 @@
 #pragma once
 // Builds the tree of an XML text.
 
+#include <string>
+
 #include "util/dom_element.h"
-#include "util/string.h"
 
 struct XML1_Parser;
 
@@ -45,9 +46,11 @@ class DOMParser {
   XML1_Parser* const parser_;
   DOMElement* document_ = nullptr;  // owned
   DOMElement* current_ = nullptr;   // the element whose end tag is awaited
-  String pending_text_;             // characters since the last end tag, wherever it was
-  char* error_message_ = nullptr;   // from strdup
-  bool failed_ = false;             // a handler has failed; the tree is not complete
+  // Characters since the last end tag, wherever it was. As bytes, for most texts come in several pieces: the push
+  // parser cuts between characters only, so converting all of them at once gives what converting each would.
+  std::string pending_text_;
+  char* error_message_ = nullptr;  // from strdup
+  bool failed_ = false;            // a handler has failed; the tree is not complete
 };
 
 }  // namespace VMQ
