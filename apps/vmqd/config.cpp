@@ -21,7 +21,7 @@ constexpr size_t largestFileBytes = 1 << 20;
 
 struct Key {
   std::string_view name;
-  const char* variable;  ///< the environment variable that the value is also put into, or null
+  std::string_view variable;  ///< the environment variable that the value is also put into; empty: none
   void (*set)(Configuration& configuration, std::string_view value);
   std::string_view help;
 };
@@ -42,26 +42,26 @@ unsigned commandTimeout(std::string_view value) {
 }
 
 constexpr Key keys[] = {
-    {"socket", nullptr, [](auto& c, auto v) { c.socket = socketPath(v); },
+    {"socket", "", [](auto& c, auto v) { c.socket = socketPath(v); },
      "path of the socket (/run/vmqd/vmqd.sock); its directory must exist"},
-    {"library", nullptr, [](auto& c, auto v) { c.library = absolutePath(v); },
+    {"library", "", [](auto& c, auto v) { c.library = absolutePath(v); },
      "path of libvmq.so (the one installed with this program)"},
     {"home", "CORVELHOME", [](auto& c, auto v) { c.home = existingDirectory(v); },
      "installation home of the agents; required"},
     {"depot", "QORDEPLOY_AGENTDEPOT", checked<plainPath>, "where deployed files arrive (the home)"},
-    {"node", nullptr, [](auto& c, auto v) { c.node = nodeName(v); }, "name of this node (the host name)"},
+    {"node", "", [](auto& c, auto v) { c.node = nodeName(v); }, "name of this node (the host name)"},
     {"trace", "KBB_RAS1", checked<anyText>, "what the component traces, such as error,tasks/=all (error)"},
     {"trace_log", "KBB_RAS1_LOG", checked<pathOrNothing>, "file that traces are appended to (standard error)"},
     {"command_timeout_seconds", "TIMEOUT", checked<commandTimeout>, "how long a command of a task may run (no limit)"},
-    {"allowed_uids", nullptr, [](auto& c, auto v) { c.allowed_uids = userIds(v); },
+    {"allowed_uids", "", [](auto& c, auto v) { c.allowed_uids = userIds(v); },
      "numbers of the users who may connect beside root and the daemon's own, joined by \",\""},
-    {"event_buffer_rows", nullptr, [](auto& c, auto v) { c.event_buffer_rows = number(v, 1, 1000000); },
+    {"event_buffer_rows", "", [](auto& c, auto v) { c.event_buffer_rows = number(v, 1, 1000000); },
      "rows kept for a watcher that is slow to read (1000)"},
-    {"maximum_request_bytes", nullptr, [](auto& c, auto v) { c.maximum_request_bytes = number(v, 1024, 1 << 28); },
+    {"maximum_request_bytes", "", [](auto& c, auto v) { c.maximum_request_bytes = number(v, 1024, 1 << 28); },
      "largest body of a request (1048576)"},
-    {"maximum_connections", nullptr, [](auto& c, auto v) { c.maximum_connections = number(v, 4, 10000); },
+    {"maximum_connections", "", [](auto& c, auto v) { c.maximum_connections = number(v, 4, 10000); },
      "clients at a time; at most three quarters of them may watch (256)"},
-    {"stop_seconds", nullptr, [](auto& c, auto v) { c.stop_seconds = number(v, 0, 3600); },
+    {"stop_seconds", "", [](auto& c, auto v) { c.stop_seconds = number(v, 0, 3600); },
      "how long a stop waits for queries that still run (5)"},
 };
 
@@ -92,7 +92,7 @@ void set(Configuration& configuration, std::string_view name, std::string_view v
   for (const Key& key : keys) {
     if (key.name != name) continue;
     key.set(configuration, value);
-    if (key.variable != nullptr) configuration.variables.emplace_back(key.variable, value);
+    if (!key.variable.empty()) configuration.variables.emplace_back(key.variable, value);
     return;
   }
   throw BadValue("is not a known key");
