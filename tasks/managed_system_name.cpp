@@ -12,12 +12,14 @@ RAS1_Unit traceUnit{"tasks/managed_system_name"};
 
 /// The part before ":DA"; empty when there is none.
 String beforeType(const String& managedSystemName) {
+  const Trace trace(traceUnit);
   const unsigned end = managedSystemName.find(String(":DA"), 0);
   return end == String::NPOS || end == 0 ? String() : managedSystemName.substr(0, end);
 }
 
 /// The position of the ":" that ends an instance name; NPOS when there is none.
 unsigned endOfInstance(const String& instanceAndHost) {
+  const Trace trace(traceUnit);
   const unsigned end = instanceAndHost.find(String(":"), 0);
   return end == 0 ? String::NPOS : end;
 }

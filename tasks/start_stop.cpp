@@ -64,8 +64,8 @@ TASK_RC stopAgent(const String& productCode, const String& instanceName, TaskQue
 
 TASK_RC restartAgent(const String& productCode, const String& instanceName, TaskQueueElem* request) {
   const Trace trace(traceUnit);
-  (void)startstopAgent("STOP", productCode, instanceName,
-                       request);  // an agent that does not run is started all the same
+  // An agent that could not be stopped, or did not run, is started all the same.
+  (void)startstopAgent("STOP", productCode, instanceName, request);
   return startstopAgent("START", productCode, instanceName, request);
 }
 

@@ -25,7 +25,8 @@ RAS1_Unit traceUnit{"tasks/task_manager"};
 std::vector<String>& commands = *new std::vector<String>();
 unsigned char initialized = 0;
 
-void startExecutor(const Trace& trace) {
+void startExecutor() {
+  const Trace trace(traceUnit);
   pthread_t thread;
   if (const int rc = pthread_create(&thread, nullptr, executor_thread, nullptr); rc != 0) {
     TRACE_ERROR(trace, "Unable to create executor thread, return code %d\n", rc);
@@ -36,12 +37,14 @@ void startExecutor(const Trace& trace) {
 
 /// Refuses the request's command.
 TASK_RC notSupported(TaskQueueElem& request) {
+  const Trace trace(traceUnit);
   request.retmsgid = String(rcToMsgId(TASK_COMMAND_NOT_SUPPORTED));
   request.retmsgparm = request.command;
   return TASK_COMMAND_NOT_SUPPORTED;
 }
 
 TASK_RC checkParameters(const Command& command, TaskQueueElem& request) {
+  const Trace trace(traceUnit);
   TASK_RC rc = TASK_OK;
   for (const RequiredParameter& parameter : command.required) {
     if (parameter.name != nullptr)
@@ -51,14 +54,15 @@ TASK_RC checkParameters(const Command& command, TaskQueueElem& request) {
 }
 
 /// Checks the parameters of a supported command, then runs or queues it.
-TASK_RC dispatch(const Trace& trace, const Command& command, TaskQueueElem& request) {
-  const ForDataAgent exception = isDataAgent(request.product) ? command.forDataAgent : ForDataAgent::kNothing;
-  if (exception == ForDataAgent::kRefused) {
+TASK_RC dispatch(const Command& command, TaskQueueElem& request) {
+  const Trace trace(traceUnit);
+  const ForDataAgent different = isDataAgent(request.product) ? command.forDataAgent : ForDataAgent::kNothing;
+  if (different == ForDataAgent::kRefused) {
     TRACE_ERROR(trace, "%s Command [%s] is not a supported command for DA", rcToMsgId(TASK_COMMAND_NOT_SUPPORTED),
                 request.command.c_str().get());
     return notSupported(request);
   }
-  if (exception != ForDataAgent::kNoChecks) {
+  if (different != ForDataAgent::kNoChecks) {
     if (const TASK_RC rc = checkParameters(command, request); rc != TASK_OK) return rc;
   }
   if (command.answer == Command::kAtOnce) return runCommandTask(command, request);
@@ -82,7 +86,7 @@ void vmq_taskmgr_init() {
     if (std::find(commands.begin(), commands.end(), name) == commands.end()) commands.push_back(name);
   }
   initializeTaskQueue();
-  startExecutor(trace);
+  startExecutor();
 }
 
 bool isSupportedTask(String name) {
@@ -134,7 +138,7 @@ int runTask(TaskQueueElem& request) {
   }
   if (command != nullptr) {
     TRACE_DETAIL(trace, "Going to run command %s", request.command.c_str().get());
-    rc = dispatch(trace, *command, request);
+    rc = dispatch(*command, request);
   }
   request.ReturnStatus(rc);
   return rc;

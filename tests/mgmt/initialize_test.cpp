@@ -17,8 +17,10 @@
 #include "tests/mgmt/running_component.h"
 #include "tests/support/failing_allocation.h"
 #include "tests/support/process_resources.h"
+#include "tests/support/temporary_directory.h"
 #include "tests/tasks/rows.h"
 #include "util/corvel_home.h"
+#include "util/string.h"
 
 namespace {
 
@@ -104,6 +106,32 @@ void startWithFailingRegistration() {
 
 TEST(EntryPoint, GoesOnAfterAFailedRegistration) {
   IN_FRESH_PROCESS(startWithFailingRegistration());
+}
+
+void startWithAStepThatThrows() {
+  const InstallationHome home;
+  const TemporaryDirectory directory;
+  const std::string log = directory / "trace.log";
+  BSS1_PutEnv("KBB_RAS1=error,mgmt/initialize=all");
+  BSS1_PutEnv(("KBB_RAS1_LOG=" + log).c_str());
+  char error[200];
+  ASSERT_TRUE(RAS1_Configure(error, sizeof error)) << error;
+  const unsigned threads = ProcessResources::now().threads;
+  {
+    // Kept in memory, trace lines would take the failure that is meant for the list of commands.
+    const FailingAllocation failing(16 * sizeof(VMQ::String));
+    EXPECT_EQ(Initialize_Mgmt_Functions(), 0u);
+    EXPECT_TRUE(failing.happened());
+  }
+  EXPECT_THAT(readWholeFile(log),
+              testing::AllOf(testing::HasSubstr("Exception while initializing the task manager: std::bad_alloc"),
+                             testing::HasSubstr("Done calling VMQ initialization routines")));
+  EXPECT_THAT(tableNames(), ElementsAre("VMQ.KAGREQT", "VMQ.KINAGT", "VMQ.KAGDYST"));
+  EXPECT_EQ(ProcessResources::now().threads, threads);
+}
+
+TEST(EntryPoint, GoesOnAfterAStepThatThrows) {
+  IN_FRESH_PROCESS(startWithAStepThatThrows());
 }
 
 void startWithoutMemoryForAManager() {

@@ -8,8 +8,10 @@
 #include <vector>
 
 #include "mgmt/rows.h"
+#include "tasks/task_queue_elem.h"
 #include "test_seam.h"
 #include "tests/mgmt/running_component.h"
+#include "tests/support/failing_allocation.h"
 #include "tests/tasks/rows.h"
 
 namespace {
@@ -130,6 +132,27 @@ TEST_F(RequestTable, EachSamplingRunsTheCommandAnew) {
   EXPECT_EQ(events.next(), expected.bytes());
   EXPECT_EQ(events.next(), expected.bytes());
   EXPECT_EQ(home.runs().size(), 2u);
+}
+
+TEST(RequestWithoutMemory, GetsNoRowAndHarmsNobody) {
+  const InstallationHome& home = runningComponent();
+  home.controlScript("exit 0");
+  const TEST_RecordedSleeps sleeps;
+  StatusEvents events;
+  vmqhost::RowBuffer rows(10);
+  const auto request = vmqhost::OpenRequest::open(
+      query("KAGREQT", {equal("COMMAND", "START"), equal("TRANSID", "t1"), equal("PRODUCT", "ux")}), rows);
+  ASSERT_NE(request, nullptr);
+  {
+    const FailingAllocation failing(sizeof(TaskQueueElem));  // its place in the queue
+    EXPECT_EQ(request->sample(), 0u);
+    EXPECT_TRUE(failing.happened());
+  }
+  EXPECT_EQ(rows.take(std::chrono::milliseconds(0)).kind, vmqhost::RowBuffer::Item::kTimedOut);
+  EXPECT_EQ(request->sample(), 0u);
+  EXPECT_EQ(rows.take(std::chrono::milliseconds(0)).kind, vmqhost::RowBuffer::Item::kRow);
+  events.next();
+  EXPECT_EQ(home.runs().size(), 1u);
 }
 
 TEST_F(RequestTable, RowsComeOnlyFromItsOwnQuery) {

@@ -136,8 +136,7 @@ TEST_F(Events, WithoutTheTablesLockAreLost) {
   EXPECT_THAT(listener.retvals, IsEmpty());
 }
 
-// ---- a request object that throws
-// ------------------------------------------------------------------------------------
+// ---- a request object that throws ----------------------------------------------------------------------------------
 
 class ThrowingManager;
 ThrowingManager* throwing_static_manager = nullptr;
@@ -188,8 +187,22 @@ TEST_F(RequestThatThrows, LeavesTheTablesLockFree) {
   EXPECT_EQ(other.get(), 0);
 }
 
-// ---- PrintSelf
-// ---------------------------------------------------------------------------------------------------------
+class UnmakeableManager : public TableManager {
+ public:
+  UnmakeableManager(const char* application, const char* table) : TableManager(application, table) {
+    throw std::runtime_error("not made");
+  }
+  bxira* CreateBxira(RequestDetail*, ContextInfo*) override { return nullptr; }
+};
+
+TEST(Registration, LetsAnExceptionOfTheManagerThrough) {
+  UnmakeableManager* manager = nullptr;
+  EXPECT_THROW(VMQ::registerTable(manager, "VMQ", "UNMAKEABLE"), std::runtime_error);
+  EXPECT_EQ(manager, nullptr);
+  EXPECT_EQ(vmqhost::findTable("VMQ", "UNMAKEABLE"), nullptr);
+}
+
+// ---- PrintSelf -----------------------------------------------------------------------------------------------------
 
 std::vector<std::string> printed(bxira& request) {
   TEST_TraceCapture trace;

@@ -5,6 +5,7 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <filesystem>
 #include <string>
 #include <vector>
 
@@ -45,8 +46,7 @@ class StartStop : public testing::Test {
   TEST_TraceCapture trace;
 };
 
-// ---- command lines
-// ---------------------------------------------------------------------------------------------------
+// ---- command lines -------------------------------------------------------------------------------------------------
 
 struct CommandLine {
   const char* situation;
@@ -125,8 +125,7 @@ TEST_F(StartStop, FailureAsAnotherUserCarriesTheWholeCommandLine) {
   EXPECT_THAT(home.runs(), IsEmpty());
 }
 
-// ---- outcomes
-// ----------------------------------------------------------------------------------------------------------
+// ---- outcomes ------------------------------------------------------------------------------------------------------
 
 TEST_F(StartStop, SuccessLeavesTheRequestAlone) {
   request.retmsgid = "before";
@@ -200,8 +199,7 @@ TEST_F(StartStop, LeavesNothingBehind) {
   EXPECT_EQ(ProcessResources::now(), before);
 }
 
-// ---- environment
-// -------------------------------------------------------------------------------------------------------
+// ---- environment ---------------------------------------------------------------------------------------------------
 
 TEST_F(StartStop, StartedAgentHasNoTraceLogAndNoHostName) {
   setenv("BXIRA_HOSTNAME", "somewhere", 1);
@@ -320,8 +318,7 @@ TEST(RemovedVariable, StaysWhenTheEnvironmentCannotBeLocked) {
               ElementsAre("Env variable [A] stays, the environment lock could not be taken, return code 35"));
 }
 
-// ---- removed characters
-// ------------------------------------------------------------------------------------------------
+// ---- removed characters --------------------------------------------------------------------------------------------
 
 std::string without(char character, const char* before) {
   String changed(before);

@@ -306,7 +306,7 @@ TEST(RequiredParameter, OverwritesAnEarlierFailureWhenItIsMissing) {
   EXPECT_EQ(request.retmsgparm, "");
 }
 
-// ---- the queued task ------------------------------------------------------------------------------------------------
+// ---- the queued task -----------------------------------------------------------------------------------------------
 
 struct Dispatch {
   const char* situation;
@@ -363,7 +363,7 @@ TEST_F(InitializedTaskManager, ReportsWhatTheTaskCameTo) {
   EXPECT_TRUE(trace.has(RAS1_DETAIL, "Return code is 1031"));
 }
 
-// ---- exceptions -----------------------------------------------------------------------------------------------------
+// ---- exceptions ----------------------------------------------------------------------------------------------------
 
 struct Failure {
   const char* command;
