@@ -77,11 +77,17 @@ std::string InstallationHome::runAs(const std::string& product, const std::strin
          "</name>\n\t\t\t<user>" + user + "</user>\n\t\t</instance>\n\t</agent>\n</runas>\n";
 }
 
+void InstallationHome::tool(const std::string& name, const std::string& body) const {
+  directory_.writeScript(name, body + "\n");
+}
+
+void InstallationHome::file(const std::string& name, const std::string& text) const {
+  directory_.writeFile(name, text);
+}
+
 void InstallationHome::clear() const {
-  runAsFile("");
-  removeControlScript();
-  fs::remove(path_ + "/runs");
-  fs::remove(path_ + "/environment");
+  for (const fs::directory_entry& entry : fs::directory_iterator(path_)) fs::remove_all(entry);
+  fs::create_directory(depot());
 }
 
 std::vector<std::string> commandLines(const TEST_TraceCapture& trace) {

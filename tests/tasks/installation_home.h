@@ -33,7 +33,12 @@ class InstallationHome {
   /// Its text with one user for one instance of one product.
   static std::string runAs(const std::string& product, const std::string& instance, const std::string& user);
 
-  /// Forgets what the control script wrote down, and removes it and the run-as database.
+  /// Another tool of the installation, such as "bin/qinfo": a shell script that does `body`.
+  void tool(const std::string& name, const std::string& body) const;
+  /// Any file of the installation or its depot.
+  void file(const std::string& name, const std::string& text) const;
+
+  /// Removes everything but the empty depot.
   void clear() const;
 
  private:
