@@ -39,7 +39,7 @@ class Array {
   void clear() noexcept { Array().swap(*this); }
 
   [[nodiscard]] unsigned int getSize() const { return size_; }
-  [[nodiscard]] unsigned int getCapacity() const { return capacity_; }
+  [[nodiscard]] unsigned int getCapacity() const { return std::max(capacity_, size_); }
   /// Never null; valid until the array changes.
   [[nodiscard]] const T* getData() const { return data_; }
 
@@ -56,10 +56,9 @@ class Array {
   }
 
   void append(const T& x) {
-    if (size_ >= Block::capacity(data_)) [[unlikely]]
+    if (!hasRoom(1)) [[unlikely]]
       return append(&x, 1);
     data_[size_++] = x;
-    capacity_ = std::max(capacity_, size_);
   }
   void append(const T* p, unsigned int n);
   void prepend(const T& x) { insert(0, &x, 1); }
@@ -90,13 +89,23 @@ class Array {
   void init(const Array& other);
   /// Moves `count` elements by assignment, in the direction in which none is overwritten before it was moved.
   void shift(unsigned int to, unsigned int from, unsigned int count);
-  void makeRoom(unsigned int n);
-  void relocate(unsigned int needed);
+  /// Sees to room for `n` more elements.
+  void makeRoom(unsigned int n) {
+    if (!hasRoom(n)) [[unlikely]]
+      relocateFor(n);
+  }
+  [[nodiscard]] bool hasRoom(unsigned int n) const {
+    const unsigned int room = Block::capacity(data_);
+    return size_ < room && n <= room - size_;
+  }
+  [[gnu::noinline]] void relocateFor(unsigned int n);
+  /// Moves everything to a block for `capacity` elements, or more if they are plain.
+  void relocate(unsigned int capacity);
   [[nodiscard]] bool isOwn(const T* p) const { return !std::less<>()(p, data_) && std::less<>()(p, data_ + size_); }
 
   T* data_ = Block::none();
   unsigned int size_ = 0;
-  unsigned int capacity_ = 8;
+  unsigned int capacity_ = 8;  ///< as shown, or less when size_ has grown beyond it: appending leaves it alone
 };
 
 template <typename T>
@@ -127,7 +136,7 @@ void Array<T>::swap(Array& other) noexcept {
 
 template <typename T>
 void Array<T>::init(const Array& other) {
-  capacity_ = other.capacity_;
+  capacity_ = other.getCapacity();
   if (other.data_ != Block::none()) {
     data_ = Block::allocate(Block::IS_PLAIN ? other.size_ : capacity_);
     std::copy_n(other.data_, other.size_, data_);
@@ -163,14 +172,15 @@ void Array<T>::insert(unsigned int i, const T* p, unsigned int n) {
 template <typename T>
 void Array<T>::remove(unsigned int i, unsigned int n) {
   if (i > size_ || n > size_ - i) throwArrayIndexOutOfBounds(__LINE__);
+  capacity_ = getCapacity();
   if (i + n < size_) shift(i, i + n, size_ - (i + n));
   size_ -= n;
 }
 
 template <typename T>
 void Array<T>::reserveCapacity(unsigned int n) {
-  if (n <= capacity_) return;
-  relocate(n);
+  if (n <= getCapacity()) return;
+  if (n > Block::capacity(data_)) relocate(n);
   capacity_ = n;
 }
 
@@ -183,23 +193,19 @@ void Array<T>::shift(unsigned int to, unsigned int from, unsigned int count) {
   }
 }
 
-/// Sees to room for `n` more elements.
 template <typename T>
-void Array<T>::makeRoom(unsigned int n) {
+void Array<T>::relocateFor(unsigned int n) {
   if (n > UINT_MAX - size_) throw std::bad_array_new_length();
-  const unsigned int needed = size_ + n;
-  relocate(std::max(needed, Block::IS_PLAIN ? 0 : capacity_));
-  capacity_ = std::max(capacity_, needed);
+  relocate(Block::IS_PLAIN ? size_ + n : std::max(size_ + n, capacity_));
 }
 
-/// Sees to a block for `needed` elements in all.
 template <typename T>
-void Array<T>::relocate(unsigned int needed) {
-  const unsigned int room = Block::capacity(data_);
-  if (needed <= room) [[likely]]
-    return;
-  if (Block::IS_PLAIN) needed = std::max({needed, room <= UINT_MAX / 2 ? room * 2 : UINT_MAX, 8u});
-  T* data = Block::allocate(needed);
+void Array<T>::relocate(unsigned int capacity) {
+  if (Block::IS_PLAIN) {
+    const unsigned int room = Block::capacity(data_);
+    capacity = std::max({capacity, room <= UINT_MAX / 2 ? room * 2 : UINT_MAX, 16u});
+  }
+  T* data = Block::allocate(capacity);
   std::move(data_, data_ + size_, data);
   Block::free(std::exchange(data_, data));
 }

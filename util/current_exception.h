@@ -3,6 +3,7 @@
 
 #include <exception>
 
+#include "util/index_out_of_bounds_exception.h"
 #include "util/trace.h"
 
 namespace VMQ {
@@ -14,6 +15,8 @@ inline void traceCurrentException(const Trace& trace, const char* activity) noex
     throw;
   } catch (const std::exception& exception) {
     TRACE_ERROR(trace, "Exception while %s: %s", activity, exception.what());
+  } catch (const IndexOutOfBoundsException& exception) {
+    TRACE_ERROR(trace, "Exception while %s: %s", activity, exception.getText());
   } catch (...) {
     TRACE_ERROR(trace, "Exception of unknown kind while %s", activity);
   }

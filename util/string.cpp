@@ -34,7 +34,6 @@ bool isWorthKeeping(unsigned int oldLength, unsigned int newLength) {
   throw IndexOutOfBoundsException(line, "vmqstr");
 }
 
-
 String& String::operator=(String&& s) noexcept {
   String taken(std::move(s));
   units_.swap(taken.units_);
@@ -68,6 +67,14 @@ String& String::assign(const unsigned short* s, unsigned int n) {
   units_[n] = 0;
   if (n < length()) units_.remove(n + 1, length() - n);
   return *this;
+}
+
+String& String::appendInLargerBlock(const unsigned short* p, unsigned int count) {
+  if (count == 0) return *this;
+  const bool own = units_.isOwn(p);
+  const size_t offset = own ? p - getData() : 0;
+  units_.relocateFor(count);
+  return appendUnits(own ? getData() + offset : p, count);
 }
 
 String& String::append(const String& s, unsigned int n) {

@@ -76,8 +76,10 @@ class String {
   }
 
   String& append(unsigned short c) {
-    units_.append(0);
-    units_[length() - 1] = c;
+    units_.grow(1);
+    unsigned short* end = units_.data_ + length();
+    end[-1] = c;
+    end[0] = 0;
     return *this;
   }
   String& append(const String& s) { return appendUnits(s.getData(), s.length()); }
@@ -145,15 +147,15 @@ class String {
 
   /// `count` units from `p`, which may be units of this text.
   String& appendUnits(const unsigned short* p, unsigned int count) {
-    if (count == 0) return *this;
-    const unsigned int position = length();
-    const bool own = units_.isOwn(p);
-    const size_t offset = own ? p - getData() : 0;
-    units_.grow(count);
-    std::copy_n(own ? getData() + offset : p, count, &units_[position]);
-    units_[position + count] = 0;
+    if (!units_.hasRoom(count)) [[unlikely]]
+      return appendInLargerBlock(p, count);
+    unsigned short* end = units_.data_ + length();
+    std::copy_n(p, count, end);
+    end[count] = 0;
+    units_.size_ += count;
     return *this;
   }
+  String& appendInLargerBlock(const unsigned short* p, unsigned int count);
 
   static void ensureLocale();
   static bool _initialized;

@@ -17,6 +17,13 @@ inline RAS1_Unit stringHashTableTraceUnit{"util/string_hash_table"};
 template <typename Value>
 class StringHashTable {
  public:
+  struct Entry {
+    unsigned int hash;
+    String key;
+    Value value;
+    Entry* next;
+  };
+
   StringHashTable(const StringHashTable&) = delete;
   StringHashTable& operator=(const StringHashTable&) = delete;
 
@@ -26,21 +33,13 @@ class StringHashTable {
 
   /// h = h * 33 + unit over the units up to the first 0, in 32 bits; the result modulo 2^31 - 1.
   [[nodiscard]] static unsigned int hashCode(const String& key);
+  /// `size` empty buckets, to be freed with delete[]. False, and `*table` null, when there is no memory.
+  static bool createTable(Entry*** table, unsigned int size);
 
  protected:
-  struct Entry {
-    unsigned int hash;
-    String key;
-    Value value;
-    Entry* next;
-  };
-
   StringHashTable() = default;
   /// The derived map has removed its entries by now.
   ~StringHashTable() = default;
-
-  /// `size` empty buckets, to be freed with delete[]. False, and `*table` null, when there is no memory.
-  static bool createTable(Entry*** table, unsigned int size);
 
   [[nodiscard]] Entry* findEntry(const String& key, unsigned int hash) const;
   /// REQUIRES: the key is not there yet.
@@ -60,7 +59,7 @@ class StringHashTable {
     entry->next = bucket;
     bucket = entry;
   }
-  void makeTable();
+  static Entry** newTable(unsigned int size);
   void rehash();
 
   Entry** table_ = nullptr;  ///< null until the first entry
@@ -121,10 +120,9 @@ typename StringHashTable<Value>::Entry* StringHashTable<Value>::findEntry(const 
 
 template <typename Value>
 void StringHashTable<Value>::insertEntry(unsigned int hash, const String& key, const Value& value) {
-  if (!table_) makeTable();
-  auto* entry = new Entry{hash, key, value, nullptr};
+  if (!table_) table_ = newTable(tableSize_);
   if (count_ >= threshold_) rehash();
-  link(entry, bucketOf(hash));
+  link(new Entry{hash, key, value, nullptr}, bucketOf(hash));
   ++count_;
 }
 
@@ -163,7 +161,7 @@ void StringHashTable<Value>::copyEntries(const StringHashTable& other) {
   threshold_ = other.threshold_;
   loadFactor_ = other.loadFactor_;
   if (!other.table_) return;
-  makeTable();
+  table_ = newTable(tableSize_);
   for (unsigned int i = 0; i < other.tableSize_; ++i) {
     for (const Entry* entry = other.table_[i]; entry; entry = entry->next) {
       insertEntry(entry->hash, entry->key, entry->value);
@@ -172,18 +170,19 @@ void StringHashTable<Value>::copyEntries(const StringHashTable& other) {
 }
 
 template <typename Value>
-void StringHashTable<Value>::makeTable() {
-  if (!createTable(&table_, tableSize_)) throw std::bad_alloc();
+typename StringHashTable<Value>::Entry** StringHashTable<Value>::newTable(unsigned int size) {
+  Entry** table = nullptr;
+  if (!createTable(&table, size)) throw std::bad_alloc();
+  return table;
 }
 
 template <typename Value>
 void StringHashTable<Value>::rehash() {
   const Trace trace(stringHashTableTraceUnit);
-  const unsigned int oldSize = tableSize_;
-  Entry** oldTable = std::exchange(table_, nullptr);
-  tableSize_ = oldSize * 2 + 1;
-  makeTable();
-  threshold_ = static_cast<unsigned int>(static_cast<float>(tableSize_) * loadFactor_);
+  const unsigned int newSize = tableSize_ * 2 + 1;
+  Entry** oldTable = std::exchange(table_, newTable(newSize));
+  const unsigned int oldSize = std::exchange(tableSize_, newSize);
+  threshold_ = static_cast<unsigned int>(static_cast<float>(newSize) * loadFactor_);
   for (unsigned int i = oldSize; i-- > 0;) {
     while (Entry* entry = oldTable[i]) {
       oldTable[i] = entry->next;
