@@ -1,0 +1,171 @@
+// The daemon's interface.
+
+#include "apps/vmqctl/api_client.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <cstring>
+
+#include "apps/vmqctl/failure.h"
+
+namespace vmqctl {
+namespace {
+
+constexpr int httpOk = 200;
+constexpr int httpForbidden = 403;
+
+constexpr const char* allowHint = "Run vmqctl as root or as a user in the daemon's allowed_uids.";
+constexpr const char* startHint =
+    "Check that it runs (systemctl status vmqd) and that --socket or VMQ_SOCKET names its socket.";
+
+[[noreturn]] void notUnderstood(const std::string& socket, const std::string& why) {
+  throw Failure(ExitCode::Failed, "The answer on " + socket + " is not understood: " + why + ".",
+                "Check that the socket is vmqd's, and of the same version as vmqctl.");
+}
+
+Json parse(const std::string& text, const std::string& socket) {
+  Json value = Json::parse(text, /*cb=*/nullptr, /*allow_exceptions=*/false);
+  if (value.is_discarded()) notUnderstood(socket, "it is not JSON");
+  return value;
+}
+
+/// Why a transfer that did not end well did not. REQUIRES: transfer.ended(), not with CURLE_OK.
+[[noreturn]] void connectionFailure(const Transfer& transfer, const std::string& socket) {
+  const int error = transfer.systemError();
+  switch (transfer.result()) {
+    case CURLE_COULDNT_CONNECT:
+      if (error == EACCES || error == EPERM) {
+        throw Failure(ExitCode::NotAllowed, "The socket " + socket + " may not be used by this user.", allowHint);
+      }
+      throw Failure(
+          ExitCode::NotReachable,
+          "No daemon answers on " + socket + (error != 0 ? std::string(": ") + std::strerror(error) : "") + ".",
+          startHint);
+    case CURLE_UNSUPPORTED_PROTOCOL:
+    case CURLE_WEIRD_SERVER_REPLY:
+      notUnderstood(socket, "it is not HTTP");
+    case CURLE_OUT_OF_MEMORY:
+      throw std::bad_alloc();
+    default:
+      throw AnswerLost(ExitCode::NotReachable,
+                       "The daemon on " + socket + " closed the connection before its answer was whole.", startHint);
+  }
+}
+
+struct ErrorHint {
+  std::string_view code;
+  const char* next;
+};
+
+constexpr ErrorHint errorHints[] = {
+    {"not_allowed", allowHint},
+    {"unknown_table", "The command \"vmqctl status\" lists the tables."},
+    {"unknown_column", "The command \"vmqctl status -o json\" lists the columns of each table."},
+    {"busy", "Try again when other clients have ended."},
+    {"body_too_large", "Send less, or raise maximum_request_bytes in the daemon's configuration."},
+    {"internal", "Look at the daemon's trace log."},
+    {"unknown_route", "Check that vmqd and vmqctl are of the same version."},
+};
+
+std::string textAt(const Json& object, const char* pointer) {
+  const Json::json_pointer at(pointer);
+  return object.is_object() && object.contains(at) && object[at].is_string() ? object[at].get<std::string>() : "";
+}
+
+/// Throws what an answer other than 200 says. The daemon's own words are shown.
+void checkStatus(long status, const std::string& body, const std::string& socket) {
+  if (status == httpOk) return;
+  const Json answer = Json::parse(body, /*cb=*/nullptr, /*allow_exceptions=*/false);
+  std::string sentence = textAt(answer, "/error/message");
+  if (sentence.empty()) {
+    sentence = "The daemon on " + socket + " answers with HTTP status " + std::to_string(status) + ".";
+  }
+  const std::string code = textAt(answer, "/error/code");
+  const auto* hint =
+      std::find_if(std::begin(errorHints), std::end(errorHints), [&](const ErrorHint& h) { return h.code == code; });
+  throw Failure(status == httpForbidden ? ExitCode::NotAllowed : ExitCode::Failed, sentence,
+                hint == std::end(errorHints) ? "" : hint->next);
+}
+
+std::string tableTarget(const std::string& table) {
+  return "/v1/tables/" + percentEncoded(table);
+}
+
+std::string eventsTarget(const std::string& table, const Predicates& predicates) {
+  const std::string query = toQueryString(predicates);
+  return tableTarget(table) + "/events" + (query.empty() ? "" : "?" + query);
+}
+
+}  // namespace
+
+Json ApiClient::exchange(const HttpRequest& request) {
+  Transfer transfer(loop_, request);
+  loop_.until([&] { return transfer.ended(); });
+  if (transfer.result() != CURLE_OK) connectionFailure(transfer, loop_.socket());
+  checkStatus(transfer.status(), transfer.body(), loop_.socket());
+  return parse(transfer.body(), loop_.socket());
+}
+
+Json ApiClient::get(const std::string& target) {
+  Json answer = exchange({target, std::nullopt});
+  if (!answer.is_object()) notUnderstood(loop_.socket(), "it is not a JSON object");
+  return answer;
+}
+
+std::vector<Json> ApiClient::query(const std::string& table, const Predicates& predicates) {
+  std::string body;
+  try {
+    body = Json{{"predicates", toJson(predicates)}}.dump();
+  } catch (const Json::type_error&) {
+    throw Failure(ExitCode::Usage, "A value of the request is not UTF-8 text.", "Give it in UTF-8.");
+  }
+  const Json answer = exchange({tableTarget(table) + "/query", body});
+  if (!answer.is_object() || !answer.contains("rows") || !answer["rows"].is_array()) {
+    notUnderstood(loop_.socket(), "it has no rows");
+  }
+  std::vector<Json> rows(answer["rows"].begin(), answer["rows"].end());
+  for (const Json& row : rows) {
+    if (!row.is_object()) notUnderstood(loop_.socket(), "a row of it is not a JSON object");
+  }
+  return rows;
+}
+
+EventStream::EventStream(HttpLoop& loop, const std::string& table, const Predicates& predicates)
+    : loop_(loop), transfer_(loop, {eventsTarget(table, predicates), std::nullopt}) {
+  const std::optional<ServerSentEvent> first = nextOfAnyName();
+  if (!first) {
+    throw Failure(ExitCode::NotReachable,
+                  "The daemon on " + loop.socket() + " ended its event stream before it was open.", startHint);
+  }
+  if (first->name != "open") notUnderstood(loop.socket(), "its event stream does not begin with \"open\"");
+}
+
+StreamEvent EventStream::next() {
+  for (;;) {
+    const std::optional<ServerSentEvent> event = nextOfAnyName();
+    if (!event) return {StreamEvent::Kind::End, nullptr};
+    if (event->name != "row" && event->name != "lost") continue;  // what a later daemon may say beside them
+    Json data = parse(event->data, loop_.socket());
+    if (!data.is_object()) notUnderstood(loop_.socket(), "an event of it is not a JSON object");
+    return {event->name == "row" ? StreamEvent::Kind::Row : StreamEvent::Kind::Lost, std::move(data)};
+  }
+}
+
+std::optional<ServerSentEvent> EventStream::nextOfAnyName() {
+  std::optional<ServerSentEvent> event;
+  loop_.until([&] {
+    // The body of another status is an error object, read whole below.
+    if (transfer_.status() == httpOk && !parser_.feed(transfer_.takeBody())) {
+      notUnderstood(loop_.socket(), "an event of it is too long");
+    }
+    event = parser_.take();
+    return event.has_value() || transfer_.ended();
+  });
+  if (event) return event;
+  const bool answered = transfer_.status() != 0;
+  if (!answered) connectionFailure(transfer_, loop_.socket());
+  checkStatus(transfer_.status(), transfer_.body(), loop_.socket());
+  return std::nullopt;
+}
+
+}  // namespace vmqctl

@@ -1,0 +1,111 @@
+// start, stop, restart.
+
+#include <memory>
+
+#include "apps/vmqctl/commands/request.h"
+#include "apps/vmqctl/commands/verbs.h"
+#include "apps/vmqctl/failure.h"
+#include "apps/vmqctl/transaction_id.h"
+
+namespace vmqctl {
+namespace {
+
+// Longer than an agent takes, shorter than a script would hang for. What waits in the daemon's queue before it counts
+// too.
+constexpr unsigned defaultTimeoutSeconds = 600;
+
+struct AgentVerb {
+  const char* name;
+  const char* command;
+  bool takesInstance;  ///< the component takes the name of an instance as it is
+  const char* description;
+  const char* example;
+};
+
+// clang-format off
+constexpr AgentVerb agentVerbs[] = {
+    {"start", "START", true, "Start an agent.",
+     "  vmqctl start ux\n"
+     "  vmqctl start ux --instance inst1"},
+    // These two always look the instance up by its managed system name.
+    {"stop", "STOP", false, "Stop an agent.",
+     "  vmqctl stop ux\n"
+     "  vmqctl stop ux --target inst1:node1:UX"},
+    {"restart", "RESTART", false, "Stop an agent and start it again.",
+     "  vmqctl restart ux --timeout 60\n"
+     "  vmqctl restart ux --target inst1:node1:UX"},
+};
+// clang-format on
+
+struct Arguments {
+  std::string product;
+  std::string target;
+  std::string instance;
+  std::string transactionId;
+  bool noWait = false;
+};
+
+Request requestOf(const AgentVerb& verb, const Arguments& arguments) {
+  if (!arguments.instance.empty() && !verb.takesInstance) {
+    throw Failure(
+        ExitCode::Usage,
+        std::string(verb.name) + " takes no --instance: it always finds the instance by its managed system name.",
+        "Name that with --target.");
+  }
+  Request request;
+  request.command = verb.command;
+  request.parameters.push_back({"PRODUCT", "eq", arguments.product});
+  if (!arguments.target.empty()) request.parameters.push_back({"TARGETMSN", "eq", arguments.target});
+  if (!arguments.instance.empty()) {
+    request.parameters.push_back({"TARGETMSN", "eq", arguments.instance});
+    request.parameters.push_back({"OPTIONAL", "eq", "INSTANCE"});
+  }
+  return request;
+}
+
+/// --transid and --no-wait, for all verbs that send a request whose outcome comes later.
+void addRequestOptions(CLI::App& verb, Arguments& arguments) {
+  const auto fits = [](const std::string& id) {
+    return id.size() <= maximumTransactionIdBytes
+               ? std::string()
+               : "longer than " + std::to_string(maximumTransactionIdBytes) + " bytes";
+  };
+  verb.add_option("--transid", arguments.transactionId, "Transaction id, unique among requests (default: one is made)")
+      ->type_name("ID")
+      ->check(notEmpty)
+      ->check(CLI::Validator(fits, ""));
+  verb.add_flag("--no-wait", arguments.noWait, "End when the request is accepted; do not wait for its status event");
+}
+
+}  // namespace
+
+void addAgentVerbs(CLI::App& app, Invocation& invocation) {
+  for (const AgentVerb& verb : agentVerbs) {
+    const auto arguments = std::make_shared<Arguments>();
+    CLI::App* sub = app.add_subcommand(verb.name, verb.description);
+    sub->add_option("PRODUCT", arguments->product, "Product code of the agent, such as ux")
+        ->type_name("")
+        ->required()
+        ->check(notEmpty);
+    CLI::Option* target =
+        sub->add_option("--target", arguments->target, "Managed system name; its instance is looked up");
+    target->type_name("MSN")->check(notEmpty);
+    sub->add_option("--instance", arguments->instance,
+                    verb.takesInstance ? "Name of the instance, not looked up" : "Not for this verb; use --target")
+        ->type_name("NAME")
+        ->check(notEmpty)
+        ->excludes(target);
+    addRequestOptions(*sub, *arguments);
+    addCommonOptions(*sub, invocation, defaultTimeoutSeconds);
+    sub->footer(std::string("Examples:\n") + verb.example);
+    sub->callback([&invocation, &verb, arguments] {
+      const Request request = requestOf(verb, *arguments);
+      const RequestOptions options = {arguments->transactionId.empty() ? newTransactionId() : arguments->transactionId,
+                                      !arguments->noWait};
+      invocation.action = {defaultTimeoutSeconds,
+                           [request, options](Session& session) { return runRequest(session, request, options); }};
+    });
+  }
+}
+
+}  // namespace vmqctl

@@ -1,0 +1,63 @@
+// query: the rows of a table.
+
+#include <memory>
+
+#include "apps/vmqctl/commands/verbs.h"
+#include "apps/vmqctl/failure.h"
+
+namespace vmqctl {
+namespace {
+
+constexpr unsigned defaultTimeoutSeconds = 600;  // some queries run a command and wait for it
+
+struct Arguments {
+  std::string table;
+  std::vector<std::string> predicates;
+};
+
+ExitCode run(Session& session, const std::string& tableName, const Predicates& predicates) {
+  session.progress.turn("waiting for the rows of " + tableName);
+  const std::vector<Json> rows = session.client.query(tableName, predicates);
+  session.progress.clear();
+
+  const Stream& out = session.console.out();
+  if (session.format == Format::AsJson) {
+    session.console.data(jsonText(Json(rows), /*oneLine=*/false, out));
+  } else if (rows.empty()) {
+    session.console.line("no rows");
+  } else {
+    std::vector<std::string> columns;
+    for (const auto& [name, value] : rows.front().items()) columns.push_back(name);
+    session.console.data(table(columns, rows, layoutFor(out)));
+  }
+  return ExitCode::Done;
+}
+
+}  // namespace
+
+void addQuery(CLI::App& app, Invocation& invocation) {
+  const auto arguments = std::make_shared<Arguments>();
+  CLI::App* sub = app.add_subcommand("query", "Show the rows of a table. With KAGREQT this runs the command it names.");
+  sub->add_option("TABLE", arguments->table, "KAGREQT, KINAGT or KAGDYST (vmqctl status lists them)")
+      ->type_name("")
+      ->required()
+      ->check(notEmpty);
+  sub->add_option("COLUMN=VALUE", arguments->predicates, "Only rows like this; also with !=, <, <=, >, >= (quote them)")
+      ->type_name("");
+  addCommonOptions(*sub, invocation, defaultTimeoutSeconds);
+  sub->footer(
+      "Examples:\n"
+      "  vmqctl query KINAGT\n"
+      "  vmqctl query KAGREQT COMMAND=GETCONFIG TRANSID=t1 PRODUCT=ux -o json\n"
+      "  vmqctl query KAGREQT COMMAND=STOP TRANSID=t2 PRODUCT=ux 'RETVAL!=0'");
+  sub->callback([&invocation, arguments] {
+    Predicates predicates;
+    for (const std::string& text : arguments->predicates) predicates.push_back(parsePredicate(text));
+    (void)toJson(predicates);  // refuses a column given twice, before anything is connected
+    invocation.action = {defaultTimeoutSeconds, [name = arguments->table, predicates](Session& session) {
+                           return run(session, name, predicates);
+                         }};
+  });
+}
+
+}  // namespace vmqctl

@@ -1,0 +1,36 @@
+// What every verb works with.
+
+#include "apps/vmqctl/settings.h"
+
+#include <sys/un.h>
+
+#include <cstdlib>
+
+#include "apps/vmqctl/failure.h"
+
+namespace vmqctl {
+
+Session::Session(const Console& theConsole, const Settings& settings, unsigned defaultTimeoutSeconds)
+    : console(theConsole),
+      format(settings.format),
+      timeoutSeconds(settings.timeoutSeconds.value_or(defaultTimeoutSeconds)),
+      progress(theConsole),
+      loop(socketPath(settings), timeoutSeconds, progress),
+      client(loop) {}
+
+std::string socketPath(const Settings& settings) {
+  const char* fromEnvironment = std::getenv("VMQ_SOCKET");
+  const std::string path = settings.socket                                          ? *settings.socket
+                           : fromEnvironment != nullptr && *fromEnvironment != '\0' ? fromEnvironment
+                                                                                    : defaultSocket;
+  constexpr std::size_t room = sizeof(sockaddr_un::sun_path);
+  if (path.empty() || path.size() >= room) {
+    throw Failure(
+        ExitCode::Usage,
+        path.empty() ? "The path of the socket is empty." : "The path of the socket is too long: " + path + ".",
+        "Give --socket a path of 1 to " + std::to_string(room - 1) + " bytes.");
+  }
+  return path;
+}
+
+}  // namespace vmqctl

@@ -1,0 +1,164 @@
+// The command line itself, and daemons that are not there.
+
+#include <gmock/gmock.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <filesystem>
+
+#include "tests/apps/vmqctl/vmqctl_process.h"
+#include "tests/support/temporary_directory.h"
+
+namespace {
+
+using testing::AllOf;
+using testing::HasSubstr;
+
+struct Case {
+  std::vector<std::string> arguments;
+  std::string error;
+};
+
+TEST(Usage, MistakesAreToldInASentenceAndEndWithTwo) {
+  const std::string longId(85, 'x');
+  const Case cases[] = {
+      {{}, "No verb is given. See vmqctl --help."},
+      {{"pause"}, "The following argument was not expected: pause. See vmqctl --help."},
+      {{"start"}, "PRODUCT is required. See vmqctl start --help."},
+      {{"start", ""}, "PRODUCT: must not be empty. See vmqctl start --help."},
+      {{"start", "ux", "lz"}, "The following argument was not expected: lz. See vmqctl start --help."},
+      {{"start", "ux", "--force"}, "The following argument was not expected: --force. See vmqctl start --help."},
+      {{"start", "ux", "--target", ""}, "--target: must not be empty. See vmqctl start --help."},
+      {{"start", "ux", "--instance", ""}, "--instance: must not be empty. See vmqctl start --help."},
+      {{"start", "ux", "--target", "a", "--instance", "b"}, "--target excludes --instance. See vmqctl start --help."},
+      {{"stop", "ux", "--instance", "inst1"},
+       "stop takes no --instance: it always finds the instance by its managed system name. Name that with --target."},
+      {{"restart", "ux", "--instance", "inst1"},
+       "restart takes no --instance: it always finds the instance by its managed system name. Name that with "
+       "--target."},
+      {{"start", "ux", "--transid", longId}, "--transid: longer than 84 bytes. See vmqctl start --help."},
+      {{"start", "ux", "--transid", ""}, "--transid: must not be empty. See vmqctl start --help."},
+      {{"start", "ux", "--timeout", "-1"}, "Could not convert: --timeout = -1. See vmqctl start --help."},
+      {{"start", "ux", "--timeout", "5s"}, "Could not convert: --timeout = 5s. See vmqctl start --help."},
+      {{"start", "ux", "--timeout", "4294967296"},
+       "Could not convert: --timeout = 4294967296. See vmqctl start --help."},
+      {{"start", "ux", "-o", "xml"}, "--output: xml not in {table,json}. See vmqctl start --help."},
+      {{"query"}, "TABLE is required. See vmqctl query --help."},
+      {{"query", "KINAGT", "PRODUCT"},
+       "\"PRODUCT\" is not of the form COLUMN=VALUE. The operators are =, !=, <, <=, > and >=; quote <, > and ! for "
+       "the "
+       "shell."},
+      {{"query", "KINAGT", "A=1", "A=2"}, "The column A is given twice. Give each column once."},
+      {{"watch", "a", "b"}, "The following argument was not expected: b. See vmqctl watch --help."},
+      {{"watch", ""}, "TRANSID: must not be empty. See vmqctl watch --help."},
+      {{"watch", "--count", "0"}, "--count: Value 0 not in range 1 to 4294967295. See vmqctl watch --help."},
+      {{"status", "--socket", ""}, "The path of the socket is empty. Give --socket a path of 1 to 107 bytes."},
+      {{"status", "--socket", std::string(108, 'x')},
+       "The path of the socket is too long: " + std::string(108, 'x') + ". Give --socket a path of 1 to 107 bytes."},
+      {{"start\x1b[2J"}, "The following argument was not expected: start\\x1b[2J. See vmqctl --help."},
+  };
+  for (const Case& each : cases) {
+    const VmqctlResult result = runVmqctl(each.arguments);
+    EXPECT_EQ(result.code, 2) << each.error;
+    EXPECT_EQ(result.out, "");
+    EXPECT_EQ(result.err, "vmqctl: " + each.error + "\n");
+  }
+}
+
+TEST(Usage, VersionIsPrinted) {
+  const VmqctlResult result = runVmqctl({"--version"});
+  EXPECT_EQ(result.code, 0);
+  EXPECT_EQ(result.out, "vmqctl " VMQ_VERSION "\n");
+  EXPECT_EQ(result.err, "");
+}
+
+TEST(Usage, HelpListsTheVerbsAndTheExitCodes) {
+  const VmqctlResult result = runVmqctl({"--help"});
+  EXPECT_EQ(result.code, 0);
+  for (const char* text : {"start", "stop", "restart", "query", "watch", "status", "--version", "130 interrupted"}) {
+    EXPECT_THAT(result.out, HasSubstr(text));
+  }
+  EXPECT_EQ(result.err, "");
+}
+
+TEST(Usage, HelpOfEachVerbHasAnExampleAndTheCommonOptions) {
+  for (const std::string verb : {"start", "stop", "restart", "query", "watch", "status"}) {
+    const VmqctlResult result = runVmqctl({verb, "--help"});
+    EXPECT_EQ(result.code, 0);
+    EXPECT_THAT(result.out,
+                AllOf(HasSubstr("Usage: vmqctl " + verb), HasSubstr("\n  vmqctl " + verb), HasSubstr("--socket PATH"),
+                      HasSubstr("-o,--output table|json"), HasSubstr("--timeout SECONDS")));
+  }
+}
+
+// ---- daemons that are not there ----
+
+class Reachability : public testing::Test {
+ protected:
+  /// A socket at this place: bound, and listening when so asked.
+  void bindSocket(bool listens) {
+    const int descriptor = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    sockaddr_un address = {};
+    address.sun_family = AF_UNIX;
+    socket_.copy(address.sun_path, sizeof address.sun_path - 1);
+    ASSERT_EQ(bind(descriptor, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
+    if (listens) {
+      ASSERT_EQ(listen(descriptor, 1), 0);
+      listener_ = descriptor;
+    } else {
+      (void)close(descriptor);  // leaves the file
+    }
+  }
+  ~Reachability() override {
+    if (listener_ >= 0) (void)close(listener_);  // nothing was sent
+  }
+
+  TemporaryDirectory directory_;
+  const std::string socket_ = directory_ / "vmqd.sock";
+  int listener_ = -1;
+};
+
+const std::string checkHint =
+    " Check that it runs (systemctl status vmqd) and that --socket or VMQ_SOCKET names its socket.\n";
+
+TEST_F(Reachability, NoSocketIsTold) {
+  for (const std::vector<std::string>& verb :
+       {std::vector<std::string>{"status"}, {"start", "ux"}, {"start", "ux", "--no-wait"}, {"query", "T"}, {"watch"}}) {
+    std::vector<std::string> arguments = verb;
+    arguments.insert(arguments.end(), {"--socket", socket_});
+    const VmqctlResult result = runVmqctl(arguments);
+    EXPECT_EQ(result.code, 7) << verb.front();
+    EXPECT_EQ(result.out, "");
+    EXPECT_THAT(result.err,
+                HasSubstr("vmqctl: No daemon answers on " + socket_ + ": No such file or directory." + checkHint));
+  }
+}
+
+TEST_F(Reachability, SocketThatADaemonLeftBehindIsTold) {
+  bindSocket(/*listens=*/false);
+  const VmqctlResult result = runVmqctl({"status", "--socket", socket_});
+  EXPECT_EQ(result.code, 7);
+  EXPECT_EQ(result.err, "vmqctl: No daemon answers on " + socket_ + ": Connection refused." + checkHint);
+}
+
+TEST_F(Reachability, SocketThatTheUserMayNotUseIsTold) {
+  bindSocket(/*listens=*/true);
+  // Nobody has to find the program and the folder of the socket.
+  const std::string program = directory_ / "vmqctl";
+  std::filesystem::copy_file(VMQCTL_PROGRAM, program);
+  ASSERT_EQ(chmod(program.c_str(), 0755), 0);
+  ASSERT_EQ(chmod(directory_.path().c_str(), 0755), 0);
+  ASSERT_EQ(chmod(socket_.c_str(), geteuid() == 0 ? 0600 : 0), 0);
+  VmqctlOptions options;
+  options.program = program;
+  options.asNobody = true;
+  const VmqctlResult result = runVmqctl({"status", "--socket", socket_}, options);
+  EXPECT_EQ(result.code, 4);
+  EXPECT_EQ(result.err, "vmqctl: The socket " + socket_ +
+                            " may not be used by this user. Run vmqctl as root or as a user in the daemon's "
+                            "allowed_uids.\n");
+}
+
+}  // namespace
