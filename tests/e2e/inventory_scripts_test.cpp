@@ -45,6 +45,11 @@ TEST_F(SampleTools, PlatformListingNamesTheArchitectureOfTheProduct) {
   EXPECT_EQ(inventory("-p zz").output, "Platform codes:\n");
 }
 
+// As it is called when it is looked up where the libraries are.
+TEST_F(SampleTools, InventoryTakesAnEmptyLastArgument) {
+  EXPECT_EQ(inventory("-d ''").output, inventory("-d").output);
+}
+
 TEST_F(SampleTools, InventoryRefusesWhatItDoesNotUnderstand) {
   for (const char* arguments : {"", "-z", "-d ux", "-p"}) EXPECT_EQ(inventory(arguments).exit_code, 64) << arguments;
 }

@@ -1,0 +1,41 @@
+#include "tests/e2e/deployment.h"
+
+Watcher::Watcher(const std::string& socket, const std::string& query) : client_(socket) {
+  const HttpReply reply = client_.watch("/v1/tables/KAGDYST/events" + (query.empty() ? "" : "?" + query));
+  EXPECT_EQ(reply.status, 200);
+  const auto first = client_.nextEvent();
+  EXPECT_TRUE(first && first->name == "open") << "the watch does not open";
+}
+
+nlohmann::json Watcher::next() {
+  while (const auto event = client_.nextEvent())
+    if (event->name == "row") return nlohmann::json::parse(event->data);
+  return nullptr;
+}
+
+void Deployment::startDaemon(const std::vector<std::string>& lines) {
+  daemon = std::make_unique<DaemonFixture>(DaemonFixture::Options{.home = home.path(), .library = "", .lines = lines});
+}
+
+nlohmann::json Deployment::query(const std::string& table, const Json& predicates) {
+  const HttpReply reply =
+      HttpClient(daemon->socket()).post("/v1/tables/" + table + "/query", Json{{"predicates", predicates}}.dump());
+  EXPECT_EQ(reply.status, 200) << reply.body;
+  return Json::parse(reply.body)["rows"];
+}
+
+nlohmann::json Deployment::ask(const Json& request) {
+  const Json rows = query("KAGREQT", request);
+  EXPECT_EQ(rows.size(), 1U) << rows;
+  return rows.at(0);
+}
+
+nlohmann::json Deployment::carryOut(const Json& request) {
+  Watcher watcher(daemon->socket(), "TRANSID=" + request["TRANSID"].get<std::string>());
+  EXPECT_THAT(ask(request), Succeeded()) << "not accepted";
+  return watcher.next();
+}
+
+std::string Deployment::command(const std::string& rest) const {
+  return home / "bin/CorvelAgent" + "  -h " + home.path() + " " + rest;
+}
