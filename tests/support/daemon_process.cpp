@@ -2,7 +2,9 @@
 
 #include <fcntl.h>
 #include <poll.h>
-#include <sys/pidfd.h>
+extern "C" {
+#include <sys/pidfd.h>  // in glibc 2.36 without C++ linkage of its own
+}
 #include <sys/prctl.h>
 #include <sys/socket.h>
 #include <sys/un.h>
