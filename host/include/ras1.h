@@ -1,6 +1,6 @@
 #pragma once
 // Trace service of the host agent. Every function here may be called from any thread, and between fork and exec of a
-// plain fork: writing a line takes no lock.
+// plain fork: writing a line takes no lock. All but RAS1_Configure leave errno as it was.
 
 #include <atomic>
 #include <cstdint>

@@ -15,20 +15,16 @@ namespace vmqhost {
 
 constinit BSS1_Lock environmentLock;
 
-namespace {
-
-/// A text with this content that is never freed. Values are few and come back again, so each is kept once.
-const char* intern(const char* text) {
+const char* keptText(const char* text) {
+  const LockScope held(environmentLock);
   static auto& texts = *new std::unordered_set<std::string>;
   return texts.emplace(text).first->c_str();
 }
 
-}  // namespace
-
 const char* environmentValue(const char* name, const char* defaultValue) try {
   const LockScope held(environmentLock);
   const char* const value = name == nullptr ? nullptr : std::getenv(name);
-  return value == nullptr ? defaultValue : intern(value);
+  return value == nullptr ? defaultValue : keptText(value);
 } catch (const std::bad_alloc&) {
   return defaultValue;  // the value cannot be kept, and a borrowed one would break the promise
 }

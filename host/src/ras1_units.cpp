@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <cerrno>
 #include <cstring>
 #include <mutex>
 #include <string>
@@ -111,7 +112,11 @@ void vmqhost::refreshUnits() {
 }
 
 uint32_t RAS1_Sync(RAS1_Unit* unit) try {
-  if (!configured.load(std::memory_order_acquire)) configureFromEnvironment();
+  if (!configured.load(std::memory_order_acquire)) {
+    const int saved = errno;  // about to be traced, perhaps
+    configureFromEnvironment();
+    errno = saved;
+  }
   const std::lock_guard held(mutex);
   if (unit->levels.load(std::memory_order_relaxed) == RAS1_UNRESOLVED) {
     unit->next = firstUnit;

@@ -4,9 +4,8 @@
 
 #include <algorithm>
 #include <atomic>
-#include <cctype>
-#include <cerrno>
 
+#include "environment.h"
 #include "lock.h"
 #include "table_manager.h"
 #include "table_registry.h"
@@ -58,8 +57,7 @@ std::vector<TableDescription> listTables() {
 }
 
 void setOriginNode(const std::string& node) {
-  const auto& kept = *new std::string(node);  // handed out as static text
-  originNode.store(kept.c_str(), std::memory_order_release);
+  originNode.store(keptText(node.c_str()), std::memory_order_release);
 }
 
 OpenRequest::OpenRequest(TableManager& manager, RowRequester& requester) : manager_(manager), context_{&requester} {}

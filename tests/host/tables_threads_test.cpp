@@ -86,8 +86,11 @@ TEST(TableThreads, RegisterAndFindTablesAtTheSameTime) {
   std::atomic<unsigned> accepted = 0;
   for (int i = 0; i < 4; ++i) {
     threads.emplace_back([&] {
-      auto& manager = *new SampleManager("RACED");
-      if (TableManager::RegisterWithManager(&manager) == 0) ++accepted;
+      auto manager = std::make_unique<SampleManager>("RACED");
+      if (TableManager::RegisterWithManager(manager.get()) == 0) {
+        (void)manager.release();  // lives as long as the process now
+        ++accepted;
+      }
       EXPECT_NE(vmqhost::findTable("TEST", "RACED"), nullptr);
     });
   }

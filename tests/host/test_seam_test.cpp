@@ -220,8 +220,10 @@ constexpr ServiceCase kServices[] = {
     {"RegisterWithManager",
      [](Services&) {
        static unsigned number = 0;
-       auto& manager = *new SampleManager(("SEAM" + std::to_string(++number)).c_str());
-       return static_cast<int>(TableManager::RegisterWithManager(&manager));
+       auto manager = std::make_unique<SampleManager>(("SEAM" + std::to_string(++number)).c_str());
+       const unsigned status = TableManager::RegisterWithManager(manager.get());
+       if (status == 0) (void)manager.release();  // lives as long as the process now
+       return static_cast<int>(status);
      }},
     {"InsertRow", [](Services& services) { return static_cast<int>(services.request.InsertRow(services.row.data())); }},
     {"Dispatch", [](Services& services) { return static_cast<int>(services.request.Dispatch()); }},

@@ -1,0 +1,1 @@
+vmq_bench(code_pages_bench SOURCES code_pages_bench.cpp)

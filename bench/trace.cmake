@@ -1,0 +1,1 @@
+vmq_bench(trace_bench SOURCES trace_bench.cpp)
