@@ -1,0 +1,53 @@
+#pragma once
+// The daemon with the component of these tests, and what they say to it.
+
+#include <nlohmann/json.hpp>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "tests/support/daemon_fixture.h"
+#include "tests/support/http_client.h"
+
+/// A vmqd with the tables of test_component.cpp.
+class TestDaemon : public DaemonFixture {
+ public:
+  explicit TestDaemon(std::vector<std::string> lines = {}, bool start = true)
+      : DaemonFixture({"", VMQ_TEST_COMPONENT, std::move(lines), start}) {}
+
+  /// The JSON of a reply to a request on a connection of its own. Throws when it is no JSON.
+  [[nodiscard]] nlohmann::json get(const std::string& path) const {
+    return nlohmann::json::parse(HttpClient(socket()).get(path).body);
+  }
+  [[nodiscard]] nlohmann::json query(const std::string& table, const std::string& predicates) const {
+    return nlohmann::json::parse(
+        HttpClient(socket()).post("/v1/tables/" + table + "/query", "{\"predicates\":" + predicates + "}").body);
+  }
+};
+
+/// The code of an error reply; what the reply holds when it is none.
+inline std::string errorCode(const HttpReply& reply) {
+  const auto json = nlohmann::json::parse(reply.body, nullptr, /*allow_exceptions=*/false);
+  if (!json.is_object() || !json.contains("error")) return reply.body;
+  return json["error"]["code"].get<std::string>();
+}
+
+/// A FIFO on which a query of the table GATE blocks.
+class Gate {
+ public:
+  explicit Gate(const std::string& path);
+  ~Gate();
+  Gate(const Gate&) = delete;
+  Gate& operator=(const Gate&) = delete;
+
+  /// The body of the query.
+  [[nodiscard]] std::string query() const { return "{\"predicates\":{\"BYTES\":\"" + path_ + "\"}}"; }
+  /// Waits until a query blocks on it.
+  void waitForQuery();
+  /// Lets it go on.
+  void open();
+
+ private:
+  const std::string path_;
+  int writer_ = -1;
+};
