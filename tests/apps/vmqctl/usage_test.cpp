@@ -6,8 +6,6 @@
 #include <sys/un.h>
 #include <unistd.h>
 
-#include <filesystem>
-
 #include "tests/apps/vmqctl/vmqctl_process.h"
 #include "tests/support/temporary_directory.h"
 
@@ -145,14 +143,9 @@ TEST_F(Reachability, SocketThatADaemonLeftBehindIsTold) {
 
 TEST_F(Reachability, SocketThatTheUserMayNotUseIsTold) {
   bindSocket(/*listens=*/true);
-  // Nobody has to find the program and the folder of the socket.
-  const std::string program = directory_ / "vmqctl";
-  std::filesystem::copy_file(VMQCTL_PROGRAM, program);
-  ASSERT_EQ(chmod(program.c_str(), 0755), 0);
-  ASSERT_EQ(chmod(directory_.path().c_str(), 0755), 0);
   ASSERT_EQ(chmod(socket_.c_str(), geteuid() == 0 ? 0600 : 0), 0);
   VmqctlOptions options;
-  options.program = program;
+  options.program = copyOfVmqctl(directory_);
   options.asNobody = true;
   const VmqctlResult result = runVmqctl({"status", "--socket", socket_}, options);
   EXPECT_EQ(result.code, 4);

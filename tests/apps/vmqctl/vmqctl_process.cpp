@@ -11,6 +11,7 @@
 #include <cerrno>
 #include <csignal>
 #include <cstring>
+#include <filesystem>
 #include <system_error>
 
 namespace {
@@ -175,4 +176,15 @@ VmqctlResult VmqctlProcess::finish() {
 
 VmqctlResult runVmqctl(std::vector<std::string> arguments, VmqctlOptions options) {
   return VmqctlProcess(std::move(arguments), std::move(options)).finish();
+}
+
+std::string copyOfVmqctl(const TemporaryDirectory& directory) {
+  namespace fs = std::filesystem;
+  const std::string copy = directory / "vmqctl";
+  const fs::perms forAll = fs::perms::owner_all | fs::perms::group_read | fs::perms::group_exec |
+                           fs::perms::others_read | fs::perms::others_exec;
+  fs::copy_file(VMQCTL_PROGRAM, copy);
+  fs::permissions(copy, forAll);
+  fs::permissions(directory.path(), forAll);
+  return copy;
 }

@@ -6,6 +6,8 @@
 #include <string>
 #include <vector>
 
+#include "tests/support/temporary_directory.h"
+
 /// What the child writes goes to pipes, so that it sees no terminal, or to a terminal of 80 columns.
 enum class Terminal {
   None,
@@ -59,3 +61,6 @@ class VmqctlProcess {
 
 /// Runs it to its end.
 VmqctlResult runVmqctl(std::vector<std::string> arguments, VmqctlOptions options = {});
+
+/// Copies the program to where every user finds it: into this directory, which is opened for them. Its path.
+std::string copyOfVmqctl(const TemporaryDirectory& directory);
