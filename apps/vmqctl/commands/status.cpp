@@ -44,7 +44,7 @@ ExitCode run(Session& session) {
                                  {"version", textIn(daemon, "version")},
                                  {"node", textIn(daemon, "node")},
                                  {"home", orElse(textIn(daemon, "home"), "none: commands are disabled")},
-                                 {"depot", orElse(textIn(daemon, "depot"), "none: every command is refused")},
+                                 {"depot", orElse(textIn(daemon, "depot"), "the home")},
                                  {"health", textIn(health, "status")},
                                  {"uptime", plain(member(health, "uptime_seconds")) + " s"},
                                  {"watchers", plain(member(health, "watchers"))},

@@ -162,7 +162,7 @@ TEST_F(StatusTest, SaysWhatIsMissing) {
   const VmqctlResult result = run({"status"});
   EXPECT_EQ(result.code, 0);
   EXPECT_THAT(result.out, HasSubstr("home      none: commands are disabled\n"
-                                    "depot     none: every command is refused\n"));
+                                    "depot     the home\n"));
 }
 
 TEST_F(StatusTest, IsJson) {
