@@ -27,7 +27,23 @@ void* operator new(size_t bytes) {
 void* operator new(size_t bytes, const std::nothrow_t&) noexcept {
   return allocate(bytes);
 }
+// The forms for arrays call the ones above by default, but not in the sanitizers' libraries.
+void* operator new[](size_t bytes) {
+  return operator new(bytes);
+}
+void* operator new[](size_t bytes, const std::nothrow_t&) noexcept {
+  return allocate(bytes);
+}
 void operator delete(void* block) noexcept {
+  std::free(block);
+}
+void operator delete[](void* block) noexcept {
+  std::free(block);
+}
+void operator delete[](void* block, size_t) noexcept {
+  std::free(block);
+}
+void operator delete[](void* block, const std::nothrow_t&) noexcept {
   std::free(block);
 }
 void operator delete(void* block, size_t) noexcept {

@@ -25,11 +25,11 @@ using VMQ::String;
 using VMQ::Util;
 
 // An allocation that is too large fails, as it does without the sanitizers.
-extern "C" const char* __asan_default_options();
+extern "C" [[gnu::visibility("default")]] const char* __asan_default_options();
 extern "C" const char* __asan_default_options() {
   return "allocator_may_return_null=1";
 }
-extern "C" const char* __tsan_default_options();
+extern "C" [[gnu::visibility("default")]] const char* __tsan_default_options();
 extern "C" const char* __tsan_default_options() {
   return "allocator_may_return_null=1";
 }
