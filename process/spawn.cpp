@@ -15,10 +15,26 @@
 #include "process/trace_errno.h"
 #include "util/trace.h"
 
+// The C library's clone by its other name, which its headers do not declare.
+extern "C" int __clone(int (*entry)(void*), void* stack, int flags, void* argument, ...);
+
 namespace VMQ {
 namespace {
 
 RAS1_Unit traceUnit{"process/spawn"};
+
+// ThreadSanitizer has a clone of its own, which takes the child for a forked one and stops watching the parent, whose
+// memory it shares.
+#if defined(__SANITIZE_THREAD__)
+#define VMQ_CLONE __clone
+#elif defined(__has_feature)
+#if __has_feature(thread_sanitizer)
+#define VMQ_CLONE __clone
+#endif
+#endif
+#ifndef VMQ_CLONE
+#define VMQ_CLONE clone
+#endif
 
 constexpr char kShell[] = "/bin/sh";
 constexpr size_t kChildStackBytes = 64 * 1024;    // runChild calls nothing but the kernel
@@ -50,7 +66,7 @@ pid_t launchChild(ChildLaunch& launch) {
   if (!stack.exists()) return -1;
   // A handler of the host that ran in the child would run in our memory, on the wrong stack.
   const AllSignalsBlocked blocked;
-  return clone(runChild, stack.top(), CLONE_VM | CLONE_VFORK | SIGCHLD, &launch);
+  return VMQ_CLONE(runChild, stack.top(), CLONE_VM | CLONE_VFORK | SIGCHLD, &launch);
 }
 
 /// The child's own lines, in its order: it cannot trace while it shares our memory.

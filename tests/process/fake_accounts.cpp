@@ -25,6 +25,7 @@ FakeAccounts::~FakeAccounts() {
   delete std::exchange(accounts, nullptr);
 }
 
+#pragma GCC visibility push(default)  // as in tests/process/system_faults.cpp
 extern "C" {
 
 int __real_getpwnam_r(const char* name, passwd* entry, char* buffer, size_t size, passwd** result);
@@ -53,3 +54,4 @@ int __wrap_getgrnam_r(const char* name, group* entry, char* buffer, size_t size,
 }
 
 }  // extern "C"
+#pragma GCC visibility pop

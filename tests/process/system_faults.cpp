@@ -90,6 +90,8 @@ std::vector<std::pair<pid_t, int>> KillRecord::kills() const {
   return *recordedKills;
 }
 
+// The linker takes shared libraries for users of these too, and hidden ones would not do for them.
+#pragma GCC visibility push(default)
 extern "C" {
 
 // What the linker's --wrap makes of each function: the real one, and the one that is called.
@@ -108,6 +110,10 @@ WRAP(void*, mmap, void* address, size_t length, int protection, int flags, int d
 
 WRAP(int, clone, int (*entry)(void*), void* stack, int flags, void* argument, ...) {
   return orErrno(SystemCall::kClone, -1, [&] { return __real_clone(entry, stack, flags, argument); });
+}
+
+WRAP(int, __clone, int (*entry)(void*), void* stack, int flags, void* argument, ...) {
+  return orErrno(SystemCall::kClone, -1, [&] { return __real___clone(entry, stack, flags, argument); });
 }
 
 WRAP(int, eventfd, unsigned initial, int flags) {
@@ -208,3 +214,4 @@ CHILD_CODE long __wrap_syscall(long number, ...) {
 }
 
 }  // extern "C"
+#pragma GCC visibility pop

@@ -5,12 +5,12 @@
 
 class NothingLeftBehind {
  public:
-  NothingLeftBehind() = default;
+  NothingLeftBehind();
   /// Gives threads and children that are about to end a few seconds for it.
   ~NothingLeftBehind();
   NothingLeftBehind(const NothingLeftBehind&) = delete;
   NothingLeftBehind& operator=(const NothingLeftBehind&) = delete;
 
  private:
-  const ProcessResources before_ = ProcessResources::now();
+  ProcessResources before_;
 };

@@ -1,0 +1,1 @@
+vmq_bench(process_bench SOURCES process_bench.cpp)
