@@ -1,0 +1,21 @@
+#pragma once
+// Expecting a range error, and reading what it says.
+
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "util/index_out_of_bounds_exception.h"
+
+/// The text of the IndexOutOfBoundsException that the call throws; empty when it throws none.
+template <class Call>
+std::string rangeErrorOf(Call call) {
+  try {
+    call();
+  } catch (const VMQ::IndexOutOfBoundsException& error) {
+    return error.getText();
+  }
+  return "";
+}
+
+#define EXPECT_RANGE_ERROR(...) EXPECT_THROW((void)(__VA_ARGS__), VMQ::IndexOutOfBoundsException)
