@@ -84,6 +84,27 @@ TEST_F(WatchTest, CtrlCEndsItEvenWhileEventsComeWithoutAPause) {
   EXPECT_EQ(result.out.back(), '\n');
 }
 
+// So it is for a job in the background of a script, which a Ctrl-C for another one must not end.
+TEST_F(WatchTest, InterruptThatWasIgnoredFromTheStartStaysIgnored) {
+  Gate interrupted;
+  daemon_.on(eventsRequest, [&](Exchange& exchange) {
+    exchange.openStream();
+    if (interrupted.wait()) exchange.event("row", statusRow("t1", "START"));
+    exchange.awaitClose();
+  });
+  VmqctlOptions options;
+  options.program = "/bin/sh";
+  VmqctlProcess process(
+      {"-c", "trap '' INT; exec \"$@\"", "sh", VMQCTL_PROGRAM, "watch", "--count", "1", "--socket", daemon_.socket()},
+      options);
+  process.awaitErrors("watching");
+  process.signal(SIGINT);
+  interrupted.open();
+  const VmqctlResult result = process.finish();
+  EXPECT_EQ(result.code, 0);
+  EXPECT_EQ(result.out, "t1: START on node1 done\n");
+}
+
 TEST_F(WatchTest, TimeOutEndsItEvenWhileEventsComeWithoutAPause) {
   daemon_.on(eventsRequest, [](Exchange& exchange) {
     exchange.openStream();
