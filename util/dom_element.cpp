@@ -58,8 +58,8 @@ const unsigned short* DOMElement::getAttribute(const char* name) const {
 const unsigned short* DOMElement::getAttribute(const unsigned short* name) const {
   const Trace trace(traceUnit);
   if (name == nullptr) return nullptr;
-  for (unsigned i = 0; i < attributes_.getLength(); ++i) {
-    const auto* const attribute = static_cast<const DOMAttr*>(attributes_.item(i));
+  for (const DOMNode* const node : attributes_) {
+    const auto* const attribute = static_cast<const DOMAttr*>(node);
     if (String::compare(attribute->getName(), name) == 0) return attribute->getValue();
   }
   return nullptr;
@@ -85,8 +85,8 @@ DOMNodeList* DOMElement::getElementsByTagName(const unsigned short* tagName) {
 
   auto* const found = new DOMNodeList(!ownsNodes);
   tag_cache_.put(name, found);
-  for (unsigned i = 0; i < children_.getLength(); ++i) {
-    auto* const child = static_cast<DOMElement*>(children_.item(i));
+  for (DOMNode* const node : children_) {
+    auto* const child = static_cast<DOMElement*>(node);
     if (String::compare(child->getTagName(), tagName) == 0) found->append(child);
   }
   return found;
@@ -101,14 +101,14 @@ void DOMElement::dump(const String& indentation, String& out) const {
   const Trace trace(traceUnit);
   const String name(tag_name_);
   out.append(indentation).append(String("<")).append(name).append(String(" "));
-  for (unsigned i = 0; i < attributes_.getLength(); ++i) {
-    attributes_.item(i)->dump(out);
+  for (const DOMNode* const attribute : attributes_) {
+    attribute->dump(out);
     out.append(String(" "));
   }
   out.append(String(">\n"));
   const String deeper = indentation + String("\t");
-  for (unsigned i = 0; i < children_.getLength(); ++i) {
-    static_cast<const DOMElement*>(children_.item(i))->dump(deeper, out);
+  for (const DOMNode* const child : children_) {
+    static_cast<const DOMElement*>(child)->dump(deeper, out);
     out.append(String("\n"));
   }
   out.append(indentation).append(String("</")).append(name).append(String(">"));

@@ -26,6 +26,25 @@ class DOMNodeList {
     Cell* next;
   };
 
+ public:
+  /// For loops over the nodes, which item would walk from the head for each of them.
+  class Iterator {
+   public:
+    explicit Iterator(const Cell* cell) : cell_(cell) {}
+    DOMNode* operator*() const { return cell_->node; }
+    Iterator& operator++() {
+      cell_ = cell_->next;
+      return *this;
+    }
+    bool operator==(const Iterator&) const = default;
+
+   private:
+    const Cell* cell_;
+  };
+  [[nodiscard]] Iterator begin() const { return Iterator(head_); }
+  [[nodiscard]] Iterator end() const { return Iterator(nullptr); }
+
+ private:
   const bool owns_nodes_;
   unsigned count_ = 0;
   Cell* head_ = nullptr;

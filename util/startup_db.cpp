@@ -129,9 +129,8 @@ void StartupDB::initialize() {
 void StartupDB::buildModel(DOMElement* root) {
   const Trace trace(traceUnit);
   if (root == nullptr) return;
-  const DOMNodeList* const children = root->getChildren();
-  for (unsigned i = 0; i < children->getLength(); ++i) {
-    DOMElement* const element = asElement(children->item(i), "agent");
+  for (DOMNode* const node : *root->getChildren()) {
+    DOMElement* const element = asElement(node, "agent");
     AgentEntry* const agent = element == nullptr ? nullptr : buildAgentEntry(element);
     if (agent != nullptr) addAgent(agent);
   }

@@ -48,9 +48,8 @@ AgentEntry* buildAgentEntry(DOMElement* element) {
     return nullptr;
   }
   auto agent = std::make_unique<AgentEntry>(trimmedText(product_code));
-  const DOMNodeList* const children = element->getChildren();
-  for (unsigned i = 0; i < children->getLength(); ++i) {
-    if (DOMElement* const instance = asElement(children->item(i), "instance")) {
+  for (DOMNode* const node : *element->getChildren()) {
+    if (DOMElement* const instance = asElement(node, "instance")) {
       agent->addInstance(buildInstanceEntry(instance));
     }
   }

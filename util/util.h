@@ -53,10 +53,12 @@ class Util {
   /// The Java installation that `homeDir`'s location script names, else JAVA_HOME when it is a directory.
   static bool getJavaHome(const String& homeDir, String& javaHome);
   /// The depot of the management server's tables, for the installation directory in `home` (ending in "/"), which it
-  /// replaces. 0 on success. `packages` appends "/PACKAGES/"; `create` makes what is missing.
+  /// replaces. 0 on success; else not, and `home` stays. `packages` appends "/PACKAGES/"; `create` makes the directory
+  /// when it is missing, which is a failure otherwise.
   static int getDepotHome(String& home, bool packages, bool create);
   static int getDepotHome_UNIX(String& home, bool packages, bool create);
-  /// Takes apart "A=level:arch;C=version:arch;G=version:arch". False when it is not of that form.
+  /// Takes apart "A=level:arch;C=version:arch;G=version:arch", in any order; the dots of the last two versions are
+  /// dropped. False when it is not of that form; some of the texts may then be set.
   static bool parseReserved(const String& reserved, String& agentLevel, String& agentArch, String& axVersion,
                             String& axArch, String& commonVersion);
 

@@ -37,6 +37,9 @@ TEST(DOMNodeListTest, NodesKeepTheirOrder) {
   }
   EXPECT_EQ(list.getLength(), 5u);
   for (unsigned i = 0; i < 5; ++i) EXPECT_EQ(list.item(i), nodes[i]);
+  std::vector<DOMNode*> visited;
+  for (DOMNode* const node : list) visited.push_back(node);
+  EXPECT_EQ(visited, nodes);
 }
 
 TEST(DOMNodeListTest, IndexOfTheLengthGivesNull) {

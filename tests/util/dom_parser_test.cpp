@@ -8,6 +8,7 @@
 #include <string>
 
 #include "test_seam.h"
+#include "tests/support/scoped_locale.h"
 #include "util/dom_attr.h"
 #include "xml1.h"
 
@@ -123,6 +124,17 @@ TEST(DOMParserTest, BytesBeyondAsciiComeBackAsTheSameBytes) {
   EXPECT_EQ(narrow(parser.getDocument()->getTagName()), "\xC3\xA9");
   EXPECT_EQ(narrow(parser.getDocument()->getAttribute("x")), "\xE2\x82\xAC");
   EXPECT_EQ(narrow(parser.getDocument()->getElementText()), "\xC3\xBC");
+}
+
+TEST(DOMParserTest, InAUtf8LocaleUnitsAreTheDocumentsCharacters) {
+  const ScopedLocale utf8("C.UTF-8");
+  DOMParser parser("<\xC3\xA9 x='\xE2\x82\xAC'>\xC3\xBC<b/></\xC3\xA9>");
+  ASSERT_TRUE(parser.parse());
+  DOMElement* const root = parser.getDocument();
+  EXPECT_EQ(std::u16string(reinterpret_cast<const char16_t*>(root->getTagName())), u"\u00E9");
+  EXPECT_EQ(std::u16string(reinterpret_cast<const char16_t*>(root->getAttribute("x"))), u"\u20AC");
+  EXPECT_EQ(std::u16string(reinterpret_cast<const char16_t*>(child(root, 0)->getElementText())), u"\u00FC");
+  EXPECT_EQ(root->getElementsByTagName("b")->getLength(), 1u);
 }
 
 TEST(DOMParserTest, DeclaredEncodingIsHeeded) {

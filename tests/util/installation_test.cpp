@@ -1,12 +1,12 @@
-// The directories of an installation and the name of its host.
+// The directories of an installation.
 #include <gtest/gtest.h>
-#include <sys/utsname.h>
 
 #include <filesystem>
 #include <thread>
 #include <vector>
 
 #include "test_seam.h"
+#include "tests/support/scoped_locale.h"
 #include "tests/support/scoped_variable.h"
 #include "tests/support/temporary_directory.h"
 #include "util/util.h"
@@ -64,12 +64,16 @@ TEST_F(InstallationTest, HomeIsKeptOnceFound) {
   EXPECT_EQ(result_.toNarrow(), path_ + "/");
 }
 
-TEST_F(InstallationTest, HomeMayBeLongerThanItsNarrowFormInAnyCodePage) {
-  const std::string deep = directory_ / std::string(200, 'd') + "/" + std::string(200, 'e');
-  fs::create_directories(deep);
-  home_.put(deep);
+TEST_F(InstallationTest, PathWithCharactersOfSeveralBytesIsNotCut) {
+  const ScopedLocale utf8("C.UTF-8");
+  const std::string name = directory_ / "\xE2\x82\xAC\xE2\x82\xAC";
+  home_.put(name);
+  depot_.put(name);
+  EXPECT_TRUE(Util::getAgentDepotDir(result_));
+  EXPECT_EQ(result_.toNarrow(), name + "/");
+  EXPECT_TRUE(fs::is_directory(name));
   EXPECT_TRUE(Util::getCorvelHomeDir(result_));
-  EXPECT_EQ(result_.toNarrow(), deep + "/");
+  EXPECT_EQ(result_.toNarrow(), name + "/");
 }
 
 TEST_F(InstallationTest, UnsetHomeIsAFailureThatIsTriedAgain) {
@@ -229,15 +233,6 @@ TEST_F(InstallationTest, ManyThreadsMayAskAtOnce) {
     });
   }
   for (std::thread& thread : threads) thread.join();
-}
-
-// ---- host name -----------------------------------------------------------------------------------------------------
-
-TEST(HostNameTest, IsTheNodeNameWithoutItsDomain) {
-  struct utsname system;
-  ASSERT_EQ(uname(&system), 0);
-  const std::string node = system.nodename;
-  EXPECT_EQ(Util::getHostName().toNarrow(), node.substr(0, node.find('.')));
 }
 
 }  // namespace

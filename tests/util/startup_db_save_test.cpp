@@ -11,6 +11,7 @@
 
 #include "test_seam.h"
 #include "tests/support/process_resources.h"
+#include "tests/support/scoped_locale.h"
 #include "tests/support/temporary_directory.h"
 #include "util/startup_db.h"
 
@@ -110,6 +111,17 @@ TEST_F(StartupDBSaveTest, BytesBeyondAsciiComeBack) {
   database.addAgent(newAgent("\xC3\xA9"));
   EXPECT_TRUE(database.save());
   EXPECT_EQ(open().getAgent(0U)->getProductCode().toNarrow(), "\xC3\xA9");
+}
+
+TEST_F(StartupDBSaveTest, CharactersOfSeveralBytesAreWrittenWhole) {
+  const ScopedLocale utf8("C.UTF-8");
+  const std::string name = "\xE2\x82\xAC\xE2\x82\xAC\xC3\xA9";
+  StartupDB database = open();
+  database.addAgent(newAgent(name));
+  EXPECT_TRUE(database.save());
+  EXPECT_EQ(readWholeFile(path_),
+            "<runas>\n\t<agent>\n\t\t<productCode>" + name + "</productCode>\n\t</agent>\n</runas>\n");
+  EXPECT_EQ(open().getAgent(0U)->getProductCode().toNarrow(), name);
 }
 
 TEST_F(StartupDBSaveTest, LongValueIsWrittenWhole) {
