@@ -2,10 +2,8 @@
 
 #include <memory>
 
-#include "apps/vmqctl/commands/request.h"
-#include "apps/vmqctl/commands/verbs.h"
+#include "apps/vmqctl/commands/request_options.h"
 #include "apps/vmqctl/failure.h"
-#include "apps/vmqctl/transaction_id.h"
 
 namespace vmqctl {
 namespace {
@@ -41,8 +39,7 @@ struct Arguments {
   std::string product;
   std::string target;
   std::string instance;
-  std::string transactionId;
-  bool noWait = false;
+  RequestArguments request;
 };
 
 Request requestOf(const AgentVerb& verb, const Arguments& arguments) {
@@ -63,20 +60,6 @@ Request requestOf(const AgentVerb& verb, const Arguments& arguments) {
   return request;
 }
 
-/// --transid and --no-wait, for all verbs that send a request whose outcome comes later.
-void addRequestOptions(CLI::App& verb, Arguments& arguments) {
-  const auto fits = [](const std::string& id) {
-    return id.size() <= maximumTransactionIdBytes
-               ? std::string()
-               : "longer than " + std::to_string(maximumTransactionIdBytes) + " bytes";
-  };
-  verb.add_option("--transid", arguments.transactionId, "Transaction id, unique among requests (default: one is made)")
-      ->type_name("ID")
-      ->check(notEmpty)
-      ->check(CLI::Validator(fits, ""));
-  verb.add_flag("--no-wait", arguments.noWait, "End when the request is accepted; do not wait for its status event");
-}
-
 }  // namespace
 
 void addAgentVerbs(CLI::App& app, Invocation& invocation) {
@@ -95,15 +78,11 @@ void addAgentVerbs(CLI::App& app, Invocation& invocation) {
         ->type_name("NAME")
         ->check(notEmpty)
         ->excludes(target);
-    addRequestOptions(*sub, *arguments);
+    addRequestOptions(*sub, arguments->request, Request::Outcome::Queued);
     addCommonOptions(*sub, invocation, defaultTimeoutSeconds);
     sub->footer(std::string("Examples:\n") + verb.example);
     sub->callback([&invocation, &verb, arguments] {
-      const Request request = requestOf(verb, *arguments);
-      const RequestOptions options = {arguments->transactionId.empty() ? newTransactionId() : arguments->transactionId,
-                                      !arguments->noWait};
-      invocation.action = {defaultTimeoutSeconds,
-                           [request, options](Session& session) { return runRequest(session, request, options); }};
+      invocation.action = requestAction(requestOf(verb, *arguments), arguments->request, defaultTimeoutSeconds);
     });
   }
 }

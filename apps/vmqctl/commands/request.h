@@ -1,6 +1,7 @@
 #pragma once
 // A command for an agent, and the one way in which every command is sent, waited for and reported.
 
+#include <functional>
 #include <string>
 
 #include "apps/vmqctl/settings.h"
@@ -16,6 +17,9 @@ struct Request {
   std::string command;    ///< COMMAND, such as "START"
   Predicates parameters;  ///< the others, but for TRANSID
   Outcome outcome = Outcome::Queued;
+  /// Shows the answer row of a success in place of the table; for commands whose answer is what was asked for.
+  std::function<void(const Console& console, const Json& answer)> shows = {};
+  std::string afterSuccess = {};  ///< a line for the person when the command has succeeded
 };
 
 struct RequestOptions {
@@ -25,6 +29,9 @@ struct RequestOptions {
 
 /// The value of a parameter, "" without it.
 std::string parameter(const Request& request, const std::string& column);
+
+/// Everything that is sent, in this order: COMMAND, TRANSID and the others.
+Predicates predicatesOf(const Request& request, const std::string& transactionId);
 
 /// Sends the request, waits for its outcome, writes it to standard output and explains a failure on standard error.
 /// Returns Done or Failed; throws a Failure when the outcome is not known.

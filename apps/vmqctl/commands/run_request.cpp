@@ -1,6 +1,7 @@
 // Runs a command and reports.
 
 #include <algorithm>
+#include <iterator>
 
 #include "apps/vmqctl/commands/request.h"
 #include "apps/vmqctl/commands/result.h"
@@ -44,12 +45,6 @@ std::string watchHint(const Session& session, const std::string& transactionId) 
   return "Watch for its status event with: vmqctl watch " +
          (socket == defaultSocket ? "" : "--socket " + quoted(socket) + " ") + quoted(transactionId) +
          " (an event that was sent meanwhile is not repeated).";
-}
-
-Predicates predicatesOf(const Request& request, const std::string& transactionId) {
-  Predicates all = {{"COMMAND", "eq", request.command}, {"TRANSID", "eq", transactionId}};
-  all.insert(all.end(), request.parameters.begin(), request.parameters.end());
-  return all;
 }
 
 Json ask(Session& session, const Request& request, const std::string& transactionId) {
@@ -133,7 +128,20 @@ void write(const Session& session, const Request& request, const RequestOptions&
                              layoutFor(session.console.out())));
 }
 
+/// Where what the command printed can be read: the daemon traces it when a command exits non-zero.
+std::string outputHint(long returnValue) {
+  constexpr long exitedNonZero[] = {1008, 1016, 1024, 1031, 1032};
+  if (std::find(std::begin(exitedNonZero), std::end(exitedNonZero), returnValue) == std::end(exitedNonZero)) return "";
+  return "What the command printed is in the trace of vmqd, in the lines STDOUT and STDERR.";
+}
+
 }  // namespace
+
+Predicates predicatesOf(const Request& request, const std::string& transactionId) {
+  Predicates all = {{"COMMAND", "eq", request.command}, {"TRANSID", "eq", transactionId}};
+  all.insert(all.end(), request.parameters.begin(), request.parameters.end());
+  return all;
+}
 
 std::string parameter(const Request& request, const std::string& column) {
   const auto found = std::find_if(request.parameters.begin(), request.parameters.end(),
@@ -173,16 +181,22 @@ ExitCode runRequest(Session& session, const Request& request, const RequestOptio
   }
 
   session.progress.clear();
-  write(session, request, options, report);
+  if (report.details.returnValue == 0 && request.shows && session.format == Format::AsTable) {
+    request.shows(session.console, report.answer);
+  } else {
+    write(session, request, options, report);
+  }
   const std::string details = explanation(report.details);
   if (report.details.returnValue != 0) {
     session.console.error(
-        words + (report.result == std::string_view("refused") ? " was refused: " : " failed: ") + details, "");
+        words + (report.result == std::string_view("refused") ? " was refused: " : " failed: ") + details,
+        outputHint(report.details.returnValue));
     return ExitCode::Failed;
   }
   // A restart whose stop failed and whose start succeeded is a success that carries the stop's message.
   if (!details.empty())
     session.console.error(words + " is " + report.result + ", but a step of it failed: " + details, "");
+  if (!request.afterSuccess.empty()) session.console.line(request.afterSuccess);
   return ExitCode::Done;
 }
 

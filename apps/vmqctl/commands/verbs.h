@@ -13,7 +13,9 @@ struct Invocation {
   Action action;
 };
 
-void addAgentVerbs(CLI::App& app, Invocation& invocation);  ///< start, stop, restart
+void addAgentVerbs(CLI::App& app, Invocation& invocation);    ///< start, stop, restart
+void addProductVerbs(CLI::App& app, Invocation& invocation);  ///< install to set-da-config
+void addInventory(CLI::App& app, Invocation& invocation);
 void addQuery(CLI::App& app, Invocation& invocation);
 void addWatch(CLI::App& app, Invocation& invocation);
 void addStatus(CLI::App& app, Invocation& invocation);

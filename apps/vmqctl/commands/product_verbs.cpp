@@ -1,0 +1,234 @@
+// install, complete-install, uninstall, get-config, set-config, remove-instance, set-da-config.
+
+#include <memory>
+#include <vector>
+
+#include "apps/vmqctl/commands/input_text.h"
+#include "apps/vmqctl/commands/request_options.h"
+#include "apps/vmqctl/commands/result.h"
+#include "apps/vmqctl/failure.h"
+
+namespace vmqctl {
+namespace {
+
+constexpr unsigned configurationTimeoutSeconds = 600;
+constexpr unsigned installationTimeoutSeconds = 7200;  // installers of large products, and what waits before them
+constexpr std::size_t contextColumnBytes = 3072;
+
+/// Everything that the verbs here can be told; each takes what it needs.
+struct Arguments {
+  std::string product;
+  std::string version;
+  std::string installer;
+  bool setRms = false;
+  bool restart = false;
+  std::string target;
+  std::string file;
+  std::string model;
+  std::vector<std::string> scripts;
+  unsigned port = 0;
+  RequestArguments request;
+};
+
+void addParameter(Request& request, const char* column, const std::string& value) {
+  if (!value.empty()) request.parameters.push_back({column, "eq", value});
+}
+
+std::string joined(const std::vector<std::string>& words) {
+  std::string text;
+  for (const std::string& word : words) text += (text.empty() ? "" : ",") + word;
+  return text;
+}
+
+// ---- options
+// ---------------------------------------------------------------------------------------------------------
+
+void takesProduct(CLI::App& verb, Arguments& a) {
+  verb.add_option("PRODUCT", a.product, "Product code, such as ux")->type_name("")->required()->check(notEmpty);
+}
+
+void takesTarget(CLI::App& verb, Arguments& a, const char* description) {
+  verb.add_option("--target", a.target, description)->type_name("MSN")->check(notEmpty);
+}
+
+void takesVersion(CLI::App& verb, Arguments& a, bool required) {
+  verb.add_option("--version", a.version, "Version of the product, such as 06.20")
+      ->type_name("V")
+      ->required(required)
+      ->check(notEmpty);
+}
+
+void takesCommand(CLI::App& verb, Arguments& a, bool required, const char* description) {
+  verb.add_option("--command", a.installer,
+                  std::string(description) + "; |DEPLOYDIR|, |DEPOTDIR| and |CORVELHOME| are replaced")
+      ->type_name("CMD")
+      ->required(required)
+      ->check(notEmpty);
+}
+
+void addInstallOptions(CLI::App& verb, Arguments& a) {
+  takesProduct(verb, a);
+  takesVersion(verb, a, /*required=*/true);
+  takesCommand(verb, a, /*required=*/true, "The installer's command line");
+  CLI::Option* const setRms =
+      verb.add_flag("--set-rms", a.setRms, "Afterwards register the product with its management server");
+  verb.add_flag("--restart", a.restart, "The installer restarts vmqd; ask complete-install for its outcome")
+      ->excludes(setRms);
+}
+
+void addUninstallOptions(CLI::App& verb, Arguments& a) {
+  takesProduct(verb, a);
+  takesVersion(verb, a, /*required=*/false);
+  takesCommand(verb, a, /*required=*/false, "For products that the inventory does not know: what installed them");
+}
+
+void addGetConfigOptions(CLI::App& verb, Arguments& a) {
+  takesProduct(verb, a);
+  takesTarget(verb, a, "Managed system name or instance");
+}
+
+void addSetConfigOptions(CLI::App& verb, Arguments& a) {
+  addGetConfigOptions(verb, a);
+  verb.add_option("FILE", a.file, "The configuration; \"-\", or none, for standard input")->type_name("");
+}
+
+void addRemoveInstanceOptions(CLI::App& verb, Arguments& a) {
+  takesProduct(verb, a);
+  verb.add_option("INSTANCE", a.target, "The instance to remove")->type_name("")->required()->check(notEmpty);
+  verb.add_option("--config", a.file, "A file for the translator to read; \"-\" for standard input")
+      ->type_name("FILE")
+      ->check(notEmpty);
+}
+
+void addDaConfigOptions(CLI::App& verb, Arguments& a) {
+  takesTarget(verb, a, "Managed system name of the data agent, such as inst1:node1:DA");
+  verb.add_option("--model", a.model, "Model file, relative to the depot")->type_name("FILE")->check(notEmpty);
+  verb.add_option("--script", a.scripts, "Script file, relative to the depot; may be given several times")
+      ->type_name("FILE")
+      ->check(notEmpty);
+  verb.add_option("--port", a.port, "Port of the agent's console")->type_name("PORT")->check(CLI::Range(1, 65535));
+}
+
+void addNoOptions(CLI::App&, Arguments&) {}
+
+// ---- requests
+// --------------------------------------------------------------------------------------------------------
+
+void buildInstall(Request& request, const Arguments& a) {
+  addParameter(request, "VERSION", a.version);
+  addParameter(request, "CONTEXT", a.installer);
+  if (a.setRms) addParameter(request, "OPTIONAL", "SETRMS");
+  if (a.restart) {
+    addParameter(request, "OPTIONAL", "REQUIRES_RESTART");
+    request.afterSuccess = "The installer runs on by itself. Ask for its outcome with: vmqctl complete-install.";
+  }
+}
+
+void buildUninstall(Request& request, const Arguments& a) {
+  addParameter(request, "VERSION", a.version);
+  addParameter(request, "CONTEXT", a.installer);
+}
+
+void buildGetConfig(Request& request, const Arguments& a) {
+  addParameter(request, "TARGETMSN", a.target);
+  request.shows = [](const Console& console, const Json& answer) {
+    const std::string configuration = textIn(answer, "CONTEXT");
+    if (configuration.empty()) console.line("There is no configuration.");
+    console.data(configuration.empty() || configuration.back() == '\n' ? configuration : configuration + "\n");
+    if (configuration.size() >= contextColumnBytes)
+      console.line("The configuration fills its column and may go on: what an answer holds ends here.");
+  };
+}
+
+void buildSetConfig(Request& request, const Arguments& a) {
+  const std::string configuration = inputText(a.file.empty() ? "-" : a.file);
+  if (configuration.empty()) throw Failure(ExitCode::Usage, "The configuration is empty; nothing was sent.", "");
+  addParameter(request, "TARGETMSN", a.target);
+  addParameter(request, "CONTEXT", configuration);
+}
+
+void buildRemoveInstance(Request& request, const Arguments& a) {
+  addParameter(request, "TARGETMSN", a.target);
+  if (!a.file.empty()) addParameter(request, "CONTEXT", inputText(a.file));
+}
+
+void buildDaConfig(Request& request, const Arguments& a) {
+  if (a.model.empty() && a.scripts.empty())
+    throw Failure(ExitCode::Usage, "There is nothing to configure: name a --model or a --script.", "");
+  addParameter(request, "TARGETMSN", a.target);
+  addParameter(request, "DACONFIG", a.model);
+  addParameter(request, "DASCRIPT", joined(a.scripts));
+  if (a.port != 0) addParameter(request, "CONTEXT", "PORT=" + std::to_string(a.port));
+}
+
+void buildNothing(Request&, const Arguments&) {}
+
+// ---- the verbs
+// -------------------------------------------------------------------------------------------------------
+
+struct ProductVerb {
+  const char* name;
+  const char* command;
+  const char* product;  ///< null: typed
+  Request::Outcome outcome;
+  unsigned timeoutSeconds;
+  void (*addOptions)(CLI::App&, Arguments&);
+  void (*build)(Request&, const Arguments&);
+  const char* description;
+  const char* example;
+};
+
+constexpr auto Queued = Request::Outcome::Queued;
+constexpr auto AtOnce = Request::Outcome::AtOnce;
+
+// clang-format off
+constexpr ProductVerb productVerbs[] = {
+    {"install", "INSTALL", nullptr, Queued, installationTimeoutSeconds, addInstallOptions, buildInstall,
+     "Install a product from the depot.",
+     "  vmqctl install ux --version 06.20 --command '|DEPLOYDIR|/install.sh -q'\n"
+     "  vmqctl install ci --version 06.20 --command '|DEPLOYDIR|/install.sh' --restart"},
+    {"complete-install", "COMPLETE_INSTALL", "", AtOnce, configurationTimeoutSeconds, addNoOptions, buildNothing,
+     "Ask for the outcome of an install that restarted vmqd. Takes 10 seconds.",
+     "  vmqctl complete-install"},
+    {"uninstall", "UNINSTALL", nullptr, Queued, installationTimeoutSeconds, addUninstallOptions, buildUninstall,
+     "Remove a product.",
+     "  vmqctl uninstall ux"},
+    {"get-config", "GETCONFIG", nullptr, AtOnce, configurationTimeoutSeconds, addGetConfigOptions, buildGetConfig,
+     "Show the configuration of a product's instance.",
+     "  vmqctl get-config ux --target inst1 > inst1.cfg"},
+    {"set-config", "SETCONFIG", nullptr, Queued, configurationTimeoutSeconds, addSetConfigOptions, buildSetConfig,
+     "Write the configuration of a product's instance.",
+     "  vmqctl set-config ux --target inst1 inst1.cfg\n"
+     "  vmqctl set-config ux < inst1.cfg"},
+    {"remove-instance", "REMOVEINSTANCE", nullptr, Queued, configurationTimeoutSeconds, addRemoveInstanceOptions,
+     buildRemoveInstance,
+     "Remove one instance of a product.",
+     "  vmqctl remove-instance ux inst1"},
+    {"set-da-config", "SETCONFIG", "um", Queued, configurationTimeoutSeconds, addDaConfigOptions, buildDaConfig,
+     "Give the data agent a model and scripts from the depot.",
+     "  vmqctl set-da-config --target inst1:node1:DA --model sales.mdl --script read_sales.sh"},
+};
+// clang-format on
+
+}  // namespace
+
+void addProductVerbs(CLI::App& app, Invocation& invocation) {
+  for (const ProductVerb& verb : productVerbs) {
+    const auto arguments = std::make_shared<Arguments>();
+    CLI::App* const sub = app.add_subcommand(verb.name, verb.description);
+    verb.addOptions(*sub, *arguments);
+    addRequestOptions(*sub, arguments->request, verb.outcome);
+    addCommonOptions(*sub, invocation, verb.timeoutSeconds);
+    sub->footer(std::string("Examples:\n") + verb.example);
+    sub->callback([&invocation, &verb, arguments] {
+      Request request;
+      request.command = verb.command;
+      request.outcome = verb.outcome;
+      addParameter(request, "PRODUCT", verb.product != nullptr ? verb.product : arguments->product);
+      verb.build(request, *arguments);
+      invocation.action = requestAction(request, arguments->request, verb.timeoutSeconds);
+    });
+  }
+}
+
+}  // namespace vmqctl

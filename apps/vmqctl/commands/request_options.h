@@ -1,0 +1,26 @@
+#pragma once
+// What every verb that sends a request takes on the command line, and how the request is then run.
+
+#include <CLI/CLI.hpp>
+#include <memory>
+#include <string>
+
+#include "apps/vmqctl/commands/request.h"
+#include "apps/vmqctl/commands/verbs.h"
+
+namespace vmqctl {
+
+struct RequestArguments {
+  std::string transactionId;
+  bool noWait = false;
+  bool dryRun = false;
+};
+
+/// Adds --transid, --dry-run and, for a command whose outcome comes later, --no-wait.
+void addRequestOptions(CLI::App& verb, RequestArguments& arguments, Request::Outcome outcome);
+
+/// Sends the request, or shows what would be sent. `dryRun` shows on standard output, as JSON, the body of the HTTP
+/// request; nothing is sent.
+Action requestAction(const Request& request, const RequestArguments& arguments, unsigned defaultTimeoutSeconds);
+
+}  // namespace vmqctl
