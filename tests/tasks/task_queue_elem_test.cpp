@@ -3,10 +3,10 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include <algorithm>
+#include <clocale>
 #include <cstring>
+#include <stdexcept>
 #include <string>
-#include <vector>
 
 #include "mgmt/kagdyst.h"
 #include "test_seam.h"
@@ -154,9 +154,24 @@ TEST(ReturnedStatus, ContextOf3072CharactersFillsItsColumn) {
   EXPECT_THAT(trace.texts(RAS1_ERROR), IsEmpty());
 }
 
+/// Makes UTF-8 the code page of this process's texts while it lives.
+class Utf8Texts {
+ public:
+  Utf8Texts() { choose("C.UTF-8"); }
+  ~Utf8Texts() { choose("C"); }
+
+ private:
+  static void choose(const char* locale) {
+    if (setlocale(LC_CTYPE, locale) == nullptr) throw std::runtime_error(locale);
+    String::initialize();
+  }
+};
+
 TEST(ReturnedStatus, TextThatTakesMoreBytesThanUnitsKeepsItsTail) {
+  const Utf8Texts utf8;
   TaskQueueElem request;
   request.retmsgparm = "caf\xc3\xa9 \xc3\xa9t\xc3\xa9.mdl";
+  ASSERT_EQ(request.retmsgparm.length(), 12u);
   request.ReturnStatus(0);
   const std::string expected = "caf\xc3\xa9 \xc3\xa9t\xc3\xa9.mdl";
   EXPECT_EQ(std::string(request.row.retmsgparm, expected.size()), expected);

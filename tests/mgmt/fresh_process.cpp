@@ -1,0 +1,16 @@
+#include "tests/mgmt/fresh_process.h"
+
+#include <unistd.h>
+
+#include <cstdio>
+#include <cstdlib>
+
+void endWithTestResult() {
+  const testing::TestResult& result = *testing::UnitTest::GetInstance()->current_test_info()->result();
+  for (int part = 0; part < result.total_part_count(); ++part) {
+    const testing::TestPartResult& each = result.GetTestPartResult(part);
+    if (each.failed()) fprintf(stderr, "%s:%d: %s\n", each.file_name(), each.line_number(), each.message());
+  }
+  fflush(nullptr);
+  _exit(result.Failed() ? EXIT_FAILURE : EXIT_SUCCESS);
+}
