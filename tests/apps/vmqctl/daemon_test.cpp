@@ -96,7 +96,8 @@ TEST_F(DaemonTest, FailureOfTheControlScriptIsExplained) {
   EXPECT_THAT(result.out, HasSubstr("  failed    1024  VMQ1024E\n"));
   EXPECT_THAT(result.err,
               EndsWith("vmqctl: STOP of bad failed: VMQ1024E " + std::string(vmqctl::findMessage("VMQ1024E")->text) +
-                       " (parameters: " + command + ")\n"));
+                       " (parameters: " + command +
+                       ") What the command printed is in the trace of vmqd, in the lines STDOUT and STDERR.\n"));
 }
 
 TEST_F(DaemonTest, ControlScriptThatIsMissingIsExplained) {

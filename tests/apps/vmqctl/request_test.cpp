@@ -153,7 +153,8 @@ TEST_F(RequestTest, FailedCommandIsExplained) {
             "START    ux                  t1       failed    1024  VMQ1024E\n");
   EXPECT_EQ(result.err, asking + accepted + "vmqctl: START of ux failed: VMQ1024E " +
                             std::string(vmqctl::findMessage("VMQ1024E")->text) +
-                            " (parameters: /h/bin/CorvelAgent  -h /h start ux)\n");
+                            " (parameters: /h/bin/CorvelAgent  -h /h start ux) What the command printed is in the "
+                            "trace of vmqd, in the lines STDOUT and STDERR.\n");
 }
 
 // A restart whose stop failed and whose start succeeded.
@@ -167,7 +168,7 @@ TEST_F(RequestTest, SuccessThatCarriesAMessageIsASuccessAndShowsIt) {
 
 TEST_F(RequestTest, HostileParametersAreShownEscaped) {
   endRequestsWith(daemon_, asked_, statusRow("t1", "START", 1024, "VMQ1024E", R"(\u001b[2Jx\ny)"));
-  EXPECT_THAT(start().err, HasSubstr("(parameters: \\x1b[2Jx\\ny)\n"));
+  EXPECT_THAT(start().err, HasSubstr("(parameters: \\x1b[2Jx\\ny)"));
 }
 
 TEST_F(RequestTest, JsonHoldsTheAnswerAndTheEvent) {
