@@ -70,7 +70,8 @@ OpenedLog::~OpenedLog() {
 
 bool OpenedLog::open(const std::string& path, std::string& error) {
   if (path.empty()) return true;
-  descriptor_ = ::open(path.c_str(), O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC | O_NOCTTY, kLogMode);
+  // O_NONBLOCK: a pipe that nobody reads is refused instead of holding the process up.
+  descriptor_ = ::open(path.c_str(), O_WRONLY | O_CREAT | O_APPEND | O_CLOEXEC | O_NOCTTY | O_NONBLOCK, kLogMode);
   if (descriptor_ >= 0 && descriptor_ <= STDERR_FILENO) {
     // A standard stream was closed; the log must not stand in for it.
     const int above = fcntl(descriptor_, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);

@@ -5,7 +5,9 @@
 
 #include <algorithm>
 #include <cstdio>
+#include <cstdlib>
 #include <mutex>
+#include <new>
 
 #include "ras1_units.h"
 #include "seam.h"
@@ -58,10 +60,13 @@ void moveClocks(int64_t milliseconds) {
 
 }  // namespace
 
-void captureLine(const RAS1_Unit& unit, RAS1_Level level, const char* function, const char* format, va_list arguments) {
+void captureLine(const RAS1_Unit& unit, RAS1_Level level, const char* function, const char* format,
+                 va_list arguments) try {
   TEST_TraceCapture::Line line{level, unit.name, function, formatted(format, arguments)};
   const std::lock_guard held(mutex);
   if (captureActive) records().lines.push_back(std::move(line));
+} catch (const std::bad_alloc&) {
+  // Tests of a lack of memory lose the line rather than the process.
 }
 
 void recordSleep(unsigned seconds) {

@@ -204,6 +204,13 @@ TEST(TraceLog, StaysAsItWasWhenTheNewOneCannotBeOpened) {
   EXPECT_THAT(log.messages(), ElementsAre("still here"));
 }
 
+TEST(TraceLog, MayNotBeAPipeThatNobodyReads) {
+  const TraceLog log("all");
+  ASSERT_EQ(mkfifo((log.path() + ".pipe").c_str(), 0600), 0);
+  const ScopedVariable name("KBB_RAS1_LOG", log.path() + ".pipe");
+  EXPECT_EQ(configureTrace(), "KBB_RAS1_LOG: \"" + log.path() + ".pipe\" cannot be opened: No such device or address");
+}
+
 TEST(TraceLog, IsOpenedAgainAfterItHasBeenMovedAway) {
   const TraceLog log("all");
   traceText("one");
