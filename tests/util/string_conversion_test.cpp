@@ -39,7 +39,7 @@ class LocaleInEffect {
 class CodePageInEffect {
  public:
   explicit CodePageInEffect(int32_t id) {
-    String::initialize();
+    const String first("later conversions keep the locale that is there");
     NLS2_ReleaseLocale(VMQ::glbLocale);
     VMQ::glbLocale = NLS2_GetLocale(NLS2_BY_CODEPAGE, id);
     EXPECT_NE(VMQ::glbLocale, nullptr);

@@ -229,12 +229,14 @@ TEST(StringReplaceTest, OccurrencesAreReplacedFromLeftToRight) {
 }
 
 TEST(StringReplaceTest, TracesWhatItIsGivenAndWhatItReturns) {
+  const String first("the first conversion traces its code page");
   const TEST_TraceCapture trace;
   (void)String::replace(String("a-b"), String("-"), String("+"));
   EXPECT_EQ(trace.texts(RAS1_DETAIL), (std::vector<std::string>{"Str [a-b], replace [-] with [+]", "Returning [a+b]"}));
 }
 
 TEST(StringReplaceTest, TracesTooWhenThereIsNothingToReplace) {
+  const String first("the first conversion traces its code page");
   const TEST_TraceCapture trace;
   (void)String::replace(String("ab"), String("-"), String("+"));
   EXPECT_EQ(trace.texts(RAS1_DETAIL), (std::vector<std::string>{"Str [ab], replace [-] with [+]", "Returning [ab]"}));
