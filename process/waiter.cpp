@@ -97,14 +97,15 @@ void* ProcTerminateThreadFunc(void* argument) {
   TRACE_DETAIL(trace, "Signaling pd->wait_cond");
   int rc = pthread_cond_signal(&pd->wait_cond);
   if (rc != 0) TRACE_ERROR(trace, "pthread_cond_signal error=%d", rc);
+  if (lockError == 0) {
+    rc = pthread_mutex_unlock(&pd->mutex);
+    if (rc != 0) TRACE_ERROR(trace, "pthread_mutex_unlock error=%d", rc);
+  }
+  // Not before the mutex is free again: whoever wakes up takes it next.
   const uint64_t one = 1;
   if (write(pd->completion.get(), &one, sizeof one) != sizeof one) {
     const int error = errno;
     TRACE_ERRNO(trace, error);
-  }
-  if (lockError == 0) {
-    rc = pthread_mutex_unlock(&pd->mutex);
-    if (rc != 0) TRACE_ERROR(trace, "pthread_mutex_unlock error=%d", rc);
   }
 
   TRACE_DETAIL(trace, "Exiting function with pthread_exit(NULL)");

@@ -205,6 +205,10 @@ void Array<T>::relocate(unsigned int capacity) {
     const unsigned int room = Block::capacity(data_);
     capacity = std::max({capacity, room <= UINT_MAX / 2 ? room * 2 : UINT_MAX, 16u});
   }
+  if (T* const resized = Block::resize(data_, capacity)) {
+    data_ = resized;
+    return;
+  }
   T* data = Block::allocate(capacity);
   std::move(data_, data_ + size_, data);
   Block::free(std::exchange(data_, data));

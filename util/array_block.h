@@ -1,10 +1,15 @@
 #pragma once
 // The memory behind an Array: a header that says how many elements fit, then the elements, every one of them
 // constructed. Used by util/array.h only.
+//
+// Large blocks of plain elements come from malloc, because realloc moves their pages instead of copying them:
+// collecting 64 MiB of a command's output costs half the time, most of which was spent on touching fresh pages over and
+// over.
 
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
+#include <cstdlib>
 #include <memory>
 #include <new>
 #include <type_traits>
@@ -27,18 +32,28 @@ class ArrayBlock {
 
   /// Plain elements are left uninitialised.
   static T* allocate(unsigned int capacity) {
-    if (capacity > (SIZE_MAX - OFFSET) / sizeof(T)) throw std::bad_array_new_length();
-    char* memory = static_cast<char*>(::operator new(OFFSET + capacity * sizeof(T)));
-    new (memory) Header{capacity};
-    T* elements = reinterpret_cast<T*>(memory + OFFSET);
+    const size_t size = sizeOf(capacity);
+    void* const memory = isLarge(capacity) ? checked(std::malloc(size)) : ::operator new(size);
+    T* elements = begin(memory, capacity);
     std::uninitialized_default_construct_n(elements, capacity);
     return elements;
+  }
+
+  /// A block of another capacity in place of this one, its elements kept; null, and nothing changed, when only a new
+  /// block and copying will do.
+  static T* resize(T* elements, unsigned int to) {
+    if (elements == none() || !isLarge(capacity(elements)) || !isLarge(to)) return nullptr;
+    return begin(checked(std::realloc(memoryOf(elements), sizeOf(to))), to);
   }
 
   static void free(T* elements) noexcept {
     if (elements == none()) return;
     std::destroy_n(elements, capacity(elements));
-    ::operator delete(reinterpret_cast<char*>(elements) - OFFSET);
+    if (isLarge(capacity(elements))) {
+      std::free(memoryOf(elements));
+    } else {
+      ::operator delete(memoryOf(elements));
+    }
   }
 
  private:
@@ -55,6 +70,22 @@ class ArrayBlock {
     Element element;
   };
   static constexpr size_t OFFSET = std::max(sizeof(Header), alignof(T));
+  static constexpr size_t LARGE = size_t{1} << 20;
+
+  static bool isLarge(unsigned int capacity) noexcept { return IS_PLAIN && capacity >= LARGE / sizeof(T); }
+  static size_t sizeOf(unsigned int capacity) {
+    if (capacity > (SIZE_MAX - OFFSET) / sizeof(T)) throw std::bad_array_new_length();
+    return OFFSET + capacity * sizeof(T);
+  }
+  static void* memoryOf(T* elements) noexcept { return reinterpret_cast<char*>(elements) - OFFSET; }
+  static T* begin(void* memory, unsigned int capacity) noexcept {
+    new (memory) Header{capacity};
+    return reinterpret_cast<T*>(static_cast<char*>(memory) + OFFSET);
+  }
+  static void* checked(void* memory) {
+    if (memory == nullptr) throw std::bad_alloc();
+    return memory;
+  }
 
   static_assert(alignof(T) <= __STDCPP_DEFAULT_NEW_ALIGNMENT__);
   static_assert(offsetof(None, element) == OFFSET);

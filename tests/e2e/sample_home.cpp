@@ -19,7 +19,9 @@ namespace {
 /// Of a file of /proc, which may vanish at any time.
 std::string contents(const fs::path& file) {
   std::ifstream stream(file, std::ios::binary);
-  return {std::istreambuf_iterator<char>(stream), {}};
+  std::ostringstream text;
+  text << stream.rdbuf();  // a read that fails ends it; stream iterators would throw
+  return text.str();
 }
 
 }  // namespace
@@ -29,7 +31,7 @@ SampleHome::SampleHome() {
     ADD_FAILURE() << "there is no agent to start, \"" VMQ_EXPORTER
                      "\": run scripts/test, which fetches it, or configure with -DVMQ_EXPORTER=PATH";
   }
-  fs::copy(VMQ_SAMPLE_HOME, path(), fs::copy_options::recursive);
+  fs::copy(VMQ_SOURCE_DIR "/examples/home", path(), fs::copy_options::recursive);
   // By a name in this home, so that the command line of each agent tells whose it is.
   const std::string program = *this / "prometheus-node-exporter";
   fs::create_symlink(VMQ_EXPORTER, program);

@@ -150,14 +150,15 @@ int calls = 0;
 BSS1_Once innerOnce = BSS1_ONCE_INIT;
 
 TEST(Once, RunsTheFirstTimeOnly) {
-  static BSS1_Once once = BSS1_ONCE_INIT;
+  BSS1_Once once = BSS1_ONCE_INIT;
   calls = 0;
   for (int i = 0; i < 3; ++i) EXPECT_EQ(BSS1_InitializeOnce(&once, [] { ++calls; }), 0);
   EXPECT_EQ(calls, 1);
 }
 
 TEST(Once, MayNeedAnother) {
-  static BSS1_Once outer = BSS1_ONCE_INIT;
+  BSS1_Once outer = BSS1_ONCE_INIT;
+  innerOnce = BSS1_ONCE_INIT;
   calls = 0;
   EXPECT_EQ(BSS1_InitializeOnce(&outer,
                                 [] {
@@ -169,7 +170,7 @@ TEST(Once, MayNeedAnother) {
 }
 
 TEST(Once, KeepsAnExceptionAndDoesNotRunAgain) {
-  static BSS1_Once once = BSS1_ONCE_INIT;
+  BSS1_Once once = BSS1_ONCE_INIT;
   calls = 0;
   EXPECT_EQ(BSS1_InitializeOnce(&once,
                                 [] {
@@ -182,7 +183,7 @@ TEST(Once, KeepsAnExceptionAndDoesNotRunAgain) {
 }
 
 TEST(Once, RefusesNull) {
-  static BSS1_Once once = BSS1_ONCE_INIT;
+  BSS1_Once once = BSS1_ONCE_INIT;
   EXPECT_EQ(BSS1_InitializeOnce(nullptr, [] {}), EINVAL);
   EXPECT_EQ(BSS1_InitializeOnce(&once, nullptr), EINVAL);
 }

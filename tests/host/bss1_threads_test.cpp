@@ -111,7 +111,8 @@ TEST(TimedWaitThreads, WakeOnTheSignal) {
 std::atomic<int> initialisations = 0;
 
 TEST(OnceThreads, WaitForTheOneThatInitialises) {
-  static BSS1_Once once = BSS1_ONCE_INIT;
+  BSS1_Once once = BSS1_ONCE_INIT;
+  initialisations = 0;
   std::vector<std::thread> threads;
   for (int i = 0; i < 4; ++i) {
     threads.emplace_back([&] {

@@ -52,11 +52,13 @@ class SampleRequest : public bxira {
 
 class SampleManager : public TableManager {
  public:
-  explicit SampleManager(const char* table) : TableManager("TEST", table) {}
+  explicit SampleManager(const std::string& table) : TableManager("TEST", table.c_str()) {}
 
-  /// A manager that lives as long as the process, registered.
-  static SampleManager& registered(const char* table) {
-    auto& manager = *new SampleManager(table);
+  /// A manager that lives as long as the process, registered. Its table's name begins so and is its own, also when the
+  /// test runs again.
+  static SampleManager& registered(const std::string& name) {
+    static std::atomic<unsigned> number = 0;
+    auto& manager = *new SampleManager(name + std::to_string(++number));
     RegisterWithManager(&manager);
     return manager;
   }
@@ -105,7 +107,7 @@ class Collector : public RowRequester {
   unsigned status = 0;  ///< what it answers
 };
 
-inline RequestDetail sampleDetail(const char* table, std::vector<RequestDetail::Predicate> predicates = {}) {
+inline RequestDetail sampleDetail(const std::string& table, std::vector<RequestDetail::Predicate> predicates = {}) {
   RequestDetail detail;
   detail.application = "TEST";
   detail.table = table;

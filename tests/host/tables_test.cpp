@@ -19,15 +19,17 @@ using vmqhost::OpenRequest;
 
 TEST(Tables, AreFoundByApplicationAndName) {
   SampleManager& manager = SampleManager::registered("FOUND");
-  EXPECT_EQ(findTable("TEST", "FOUND"), &manager);
-  EXPECT_EQ(findTable("OTHER", "FOUND"), nullptr);
-  EXPECT_EQ(findTable("TEST", "found"), nullptr);
+  const std::string name = manager.table();
+  EXPECT_EQ(findTable("TEST", name), &manager);
+  EXPECT_EQ(findTable("OTHER", name), nullptr);
+  EXPECT_EQ(findTable("TEST", "found" + name.substr(5)), nullptr);
+  EXPECT_EQ(findTable("TEST", name + "x"), nullptr);
   EXPECT_EQ(findTable("", ""), nullptr);
 }
 
 TEST(Tables, KeepTheirNames) {
   std::string table = "NAMED";
-  const SampleManager manager(table.c_str());
+  const SampleManager manager(table);
   table.assign("#####");
   EXPECT_STREQ(manager.application(), "TEST");
   EXPECT_STREQ(manager.table(), "NAMED");
@@ -36,21 +38,21 @@ TEST(Tables, KeepTheirNames) {
 
 TEST(Tables, AreRegisteredOnlyOnceByTheSameName) {
   SampleManager& first = SampleManager::registered("TWICE");
-  SampleManager second("TWICE");
+  SampleManager second(first.table());
   EXPECT_EQ(TableManager::RegisterWithManager(&second), unsigned{EEXIST});
   EXPECT_EQ(TableManager::RegisterWithManager(&first), unsigned{EEXIST});
-  EXPECT_EQ(findTable("TEST", "TWICE"), &first);
+  EXPECT_EQ(findTable("TEST", first.table()), &first);
   EXPECT_EQ(TableManager::RegisterWithManager(nullptr), unsigned{EINVAL});
 }
 
 TEST(Tables, AreListedInTheOrderOfRegistrationWithTheirColumns) {
-  SampleManager::registered("LISTED1");
-  SampleManager::registered("LISTED2");
+  const SampleManager& first = SampleManager::registered("LISTED");
+  const SampleManager& second = SampleManager::registered("LISTED");
   const std::vector<vmqhost::TableDescription> tables = listTables();
   ASSERT_GE(tables.size(), 2u);
   const vmqhost::TableDescription& last = tables.back();
-  EXPECT_EQ(tables[tables.size() - 2].table, "LISTED1");
-  EXPECT_EQ(last.table, "LISTED2");
+  EXPECT_EQ(tables[tables.size() - 2].table, first.table());
+  EXPECT_EQ(last.table, second.table());
   EXPECT_EQ(last.application, "TEST");
   EXPECT_EQ(last.row_bytes, kSampleRowBytes);
   ASSERT_EQ(last.columns.size(), 3u);
@@ -62,8 +64,9 @@ TEST(Tables, AreListedInTheOrderOfRegistrationWithTheirColumns) {
 }
 
 TEST(Tables, ThatCannotMakeARequestAreListedWithoutColumns) {
-  SampleManager::registered("REFUSING").refuse = true;
-  EXPECT_EQ(listTables().back().table, "REFUSING");
+  SampleManager& manager = SampleManager::registered("REFUSING");
+  manager.refuse = true;
+  EXPECT_EQ(listTables().back().table, manager.table());
   EXPECT_TRUE(listTables().back().columns.empty());
 }
 
@@ -83,12 +86,11 @@ TEST(OriginNode, IsWhatTheProcessHasSet) {
 class OpenRequests : public testing::Test {
  protected:
   /// A table of the test's own.
-  const std::string name_ = testing::UnitTest::GetInstance()->current_test_info()->name();
-  SampleManager& table_ = SampleManager::registered(name_.c_str());
+  SampleManager& table_ = SampleManager::registered("OPEN");
   Collector collector_;
 
   std::unique_ptr<OpenRequest> open(std::vector<RequestDetail::Predicate> predicates, RowRequester& requester) {
-    return OpenRequest::open(sampleDetail(name_.c_str(), std::move(predicates)), requester);
+    return OpenRequest::open(sampleDetail(table_.table(), std::move(predicates)), requester);
   }
 };
 

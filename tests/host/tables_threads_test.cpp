@@ -28,7 +28,7 @@ TEST(TableThreads, OpenAndCloseRequestsWhileEventsArrive) {
     clients.emplace_back([&] {
       for (int i = 0; i < 200; ++i) {
         Collector collector;  // gone as soon as the request is: a late delivery would show
-        const auto request = OpenRequest::open(sampleDetail("BUSY"), collector);
+        const auto request = OpenRequest::open(sampleDetail(table.table()), collector);
         ASSERT_NE(request, nullptr);
         request->sample();
       }
@@ -44,7 +44,7 @@ TEST(TableThreads, LoseNoSampledRowToAnEventOfTheSameRequest) {
   SampleManager& table = SampleManager::registered("MIXED");
   table.sample = {sampleRow("sampled", 0, "")};
   RowBuffer buffer(100000);
-  const auto request = OpenRequest::open(sampleDetail("MIXED"), buffer);
+  const auto request = OpenRequest::open(sampleDetail(table.table()), buffer);
   constexpr int kRounds = 1000;
   std::thread executor([&] {
     for (int i = 0; i < kRounds; ++i) table.deliver(sampleRow("event", 1, ""));
@@ -71,8 +71,8 @@ TEST(TableThreads, DeliverEventsWhileASampleTakesLong) {
   };
   RowBuffer slow(10);
   RowBuffer other(10);
-  const auto sampled = OpenRequest::open(sampleDetail("LONG"), slow);
-  const auto watching = OpenRequest::open(sampleDetail("LONG"), other);
+  const auto sampled = OpenRequest::open(sampleDetail(table.table()), slow);
+  const auto watching = OpenRequest::open(sampleDetail(table.table()), other);
   std::thread client([&] { sampled->sample(); });
   while (!started) std::this_thread::yield();
   table.deliver(sampleRow("event", 1, ""));
@@ -82,16 +82,18 @@ TEST(TableThreads, DeliverEventsWhileASampleTakesLong) {
 }
 
 TEST(TableThreads, RegisterAndFindTablesAtTheSameTime) {
+  static unsigned round = 0;
+  const std::string name = "RACED" + std::to_string(++round);
   std::vector<std::thread> threads;
   std::atomic<unsigned> accepted = 0;
   for (int i = 0; i < 4; ++i) {
     threads.emplace_back([&] {
-      auto manager = std::make_unique<SampleManager>("RACED");
+      auto manager = std::make_unique<SampleManager>(name);
       if (TableManager::RegisterWithManager(manager.get()) == 0) {
         (void)manager.release();  // lives as long as the process now
         ++accepted;
       }
-      EXPECT_NE(vmqhost::findTable("TEST", "RACED"), nullptr);
+      EXPECT_NE(vmqhost::findTable("TEST", name), nullptr);
     });
   }
   for (std::thread& thread : threads) thread.join();
@@ -101,7 +103,7 @@ TEST(TableThreads, RegisterAndFindTablesAtTheSameTime) {
 TEST(HandleThreads, UseAndDropTheSameHandle) {
   SampleManager& table = SampleManager::registered("HANDLES");
   Collector collector;
-  const auto request = OpenRequest::open(sampleDetail("HANDLES"), collector);
+  const auto request = OpenRequest::open(sampleDetail(table.table()), collector);
   const RES1_Handle handle = request->request().handle();
   std::vector<std::thread> threads;
   for (int i = 0; i < 4; ++i) {

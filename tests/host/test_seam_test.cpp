@@ -220,7 +220,7 @@ constexpr ServiceCase kServices[] = {
     {"RegisterWithManager",
      [](Services&) {
        static unsigned number = 0;
-       auto manager = std::make_unique<SampleManager>(("SEAM" + std::to_string(++number)).c_str());
+       auto manager = std::make_unique<SampleManager>("SEAM" + std::to_string(++number));
        const unsigned status = TableManager::RegisterWithManager(manager.get());
        if (status == 0) (void)manager.release();  // lives as long as the process now
        return static_cast<int>(status);

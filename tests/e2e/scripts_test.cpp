@@ -1,0 +1,36 @@
+// The scripts that a person runs first: what a test can say about them without installing packages and building.
+
+#include <gmock/gmock.h>
+
+#include <filesystem>
+
+#include "tests/e2e/shell.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+
+TEST(Scripts, EachOneIsWellFormedShellAndRunsFromAnywhere) {
+  unsigned seen = 0;
+  for (const char* folder : {"scripts", ".ci", "examples/home/bin", "examples/home/zlpqor6/lx8266/bin"}) {
+    for (const auto& entry : fs::directory_iterator(fs::path(VMQ_SOURCE_DIR) / folder)) {
+      const std::string script = entry.path();
+      const bool is_sourced = script.ends_with(".sh") || script.ends_with(".shl");
+      EXPECT_EQ(runShell("/bin/sh -n " + quoted(script)).output, "") << script;
+      EXPECT_EQ(fs::status(script).permissions() & fs::perms::owner_exec,
+                is_sourced ? fs::perms::none : fs::perms::owner_exec)
+          << script;
+      ++seen;
+    }
+  }
+  EXPECT_GE(seen, 8U);
+}
+
+TEST(Scripts, HelpOfTheTestCommandIsWhatStandsInIt) {
+  const Outcome outcome = runShell("cd / && " + quoted(VMQ_SOURCE_DIR "/scripts/test") + " --help");
+  EXPECT_EQ(outcome.exit_code, 0);
+  EXPECT_THAT(outcome.output, testing::StartsWith("Installs what the tests need"));
+  EXPECT_THAT(outcome.output, testing::HasSubstr("scripts/test [PRESET...]"));
+}
+
+}  // namespace
