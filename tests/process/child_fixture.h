@@ -22,7 +22,7 @@ class ChildFixture : public testing::Test {
   }
   /// A script that waits until the test calls letGo().
   std::string scriptThatWaits(const std::string& before = "", const std::string& after = "") {
-    return script(before + "\nwhile [ ! -e go ]; do sleep 0.01; done\n" + after);
+    return script(before + "\nwhile [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done\n" + after);
   }
   void letGo() const { directory.writeFile("go", ""); }
 

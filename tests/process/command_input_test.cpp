@@ -65,7 +65,7 @@ TEST_F(CommandInput, ChildThatClosesItsOutputsStillGetsItsInput) {
 }
 
 TEST_F(CommandInput, BackgroundProcessThatHoldsTheInputDoesNotHoldTheRun) {
-  const std::string command = script("while [ ! -e go ]; do sleep 0.01; done <&0 &\necho started");
+  const std::string command = script("while [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done <&0 &\necho started");
   EXPECT_EQ(run(command, megabyte), success("started\n"));
   letGo();
 }

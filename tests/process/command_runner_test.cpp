@@ -145,7 +145,7 @@ TEST_F(CommandRunner, BytesThatAreNoTextComeBackAsTheyWere) {
 TEST_F(CommandRunner, BackgroundProcessThatKeepsThePipesDoesNotHoldTheRun) {
   for (const bool nonBlocking : {false, true}) {
     const auto before = std::chrono::steady_clock::now();
-    const std::string command = script("while [ ! -e go ]; do sleep 0.01; done &\necho started; exit 4");
+    const std::string command = script("while [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done &\necho started; exit 4");
     EXPECT_EQ(run(command, "", nullptr, nonBlocking), (Result{true, 4, "started\n", ""}));
     EXPECT_LT(std::chrono::steady_clock::now() - before, std::chrono::seconds(30));
   }
@@ -207,7 +207,7 @@ TEST_F(CommandRunner, AgentCommandIsOneWhoseTextContainsTheNameAnywhere) {
 }
 
 TEST_F(CommandRunner, AgentLeftBehindDoesNotHoldTheRun) {
-  EXPECT_EQ(run(agentScript("while [ ! -e go ]; do sleep 0.01; done &\necho started")), success("started\n"));
+  EXPECT_EQ(run(agentScript("while [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done &\necho started")), success("started\n"));
   letGo();
 }
 

@@ -76,8 +76,8 @@ TEST_F(CommandTimeout, SetTimeoutIsBoundedFromTheStartNotFromTheWait) {
   });
   // Closes its outputs after 25 seconds, so the runner goes to wait with 5 left: one slice.
   const Result result =
-      run(script("echo begun; while [ ! -e closing ]; do sleep 0.01; done; exec >&- 2>&-; "
-                 "while [ ! -e go ]; do sleep 0.01; done"));
+      run(script("echo begun; while [ ! -e closing ] && [ -e $0 ]; do sleep 0.01; done; exec >&- 2>&-; "
+                 "while [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done"));
   time.join();
   expectKilled(result);
   EXPECT_EQ(sleeps.waitedMilliseconds().size(), 1u);
@@ -85,14 +85,14 @@ TEST_F(CommandTimeout, SetTimeoutIsBoundedFromTheStartNotFromTheWait) {
 }
 
 TEST_F(CommandTimeout, CommandThatClosesItsOutputsHasTheUsualTimeFromThenOn) {
-  const Result result = run(script("exec >&- 2>&-; while [ ! -e go ]; do sleep 0.01; done"));
+  const Result result = run(script("exec >&- 2>&-; while [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done"));
   expectKilled(result);
   EXPECT_EQ(sleeps.waitedMilliseconds().size(), 30u);
   letGo();
 }
 
 TEST_F(CommandTimeout, AgentCommandHasTheUsualTime) {
-  const Result result = run(agentScript("while [ ! -e go ]; do sleep 0.01; done"));
+  const Result result = run(agentScript("while [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done"));
   expectKilled(result);
   EXPECT_EQ(sleeps.waitedMilliseconds().size(), 30u);
   letGo();
@@ -100,7 +100,7 @@ TEST_F(CommandTimeout, AgentCommandHasTheUsualTime) {
 
 TEST_F(CommandTimeout, AgentCommandThatNeitherReadsNorEndsIsKilled) {
   const ScopedVariable timeout("TIMEOUT", "1");
-  const Result result = run(agentScript("while [ ! -e go ]; do sleep 0.01; done"), std::string(size_t{1} << 20, 'x'));
+  const Result result = run(agentScript("while [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done"), std::string(size_t{1} << 20, 'x'));
   expectKilled(result);
   EXPECT_EQ(sleeps.waitedMilliseconds().size(), 1u);
   letGo();

@@ -155,6 +155,18 @@ TEST(ArrayTest, PlainElementsMoveRarelyWhenManyAreAppended) {
   EXPECT_EQ(array[99999], 99999);
 }
 
+TEST(ArrayTest, LargePlainArrayKeepsItsElementsAsItGrows) {
+  constexpr unsigned int many = 3000000;  // of several MiB, whose blocks are resized in place
+  Array<unsigned short> array;
+  for (unsigned int i = 0; i < many; ++i) array.append(static_cast<unsigned short>(i));
+  const Array<unsigned short> copy(array);
+  array.append(array.getData(), many);
+  ASSERT_EQ(array.getSize(), 2 * many);
+  for (unsigned int i = 0; i < 2 * many; ++i) ASSERT_EQ(array[i], static_cast<unsigned short>(i % many)) << i;
+  ASSERT_EQ(copy.getSize(), many);
+  EXPECT_EQ(copy[many - 1], static_cast<unsigned short>(many - 1));
+}
+
 TEST(ArrayTest, MoreElementsThanCanBeCountedFailLikeAnAllocation) {
   Array<unsigned short> array = {};
   array.append(1);
