@@ -103,6 +103,7 @@ TEST_F(DepotHomeTest, DirectoryThatCannotBeCreatedIsAFailure) {
 }
 
 TEST_F(DepotHomeTest, CommandThatCannotBeStartedIsAFailure) {
+  (void)ask();  // sanitizers need descriptors of their own when they see a type for the first time
   rlimit before{};
   ASSERT_EQ(getrlimit(RLIMIT_NOFILE, &before), 0);
   rlimit none = before;
