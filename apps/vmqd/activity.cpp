@@ -19,9 +19,10 @@ unsigned Activity::count() const {
   return count_;
 }
 
-bool Activity::waitForNone(std::chrono::milliseconds patience) {
+unsigned Activity::waitForNone(std::chrono::milliseconds patience) {
   std::unique_lock held(mutex_);
-  return none_.wait_for(held, patience, [this] { return count_ == 0; });
+  (void)none_.wait_for(held, patience, [this] { return count_ == 0; });
+  return count_;
 }
 
 }  // namespace vmqd

@@ -13,8 +13,8 @@ class Activity {
   void begin();
   void end();
   [[nodiscard]] unsigned count() const;
-  /// Waits until nothing is under way. False when something still is after `patience`.
-  bool waitForNone(std::chrono::milliseconds patience);
+  /// Waits until nothing is under way, for `patience` at most. Returns what still is.
+  unsigned waitForNone(std::chrono::milliseconds patience);
 
   /// One that lasts as long as the object.
   class Scope {

@@ -116,6 +116,8 @@ MHD_Result HttpConnection::answer(const char* method, const char* path) {
   Reply reply(reply_);
   {
     const Activity::Scope working(server_.working_);
+    // A stop sets it before it looks at who is working, so no answer begins behind its back.
+    if (server_.stopping_) return refuseNow(errors::busy, "The daemon is stopping.");
     server_.answer_(request, reply);
   }
   return send(reply, false);

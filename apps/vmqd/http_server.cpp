@@ -74,14 +74,15 @@ HttpServer::~HttpServer() {
   if (daemon_ != nullptr) MHD_stop_daemon(daemon_);
 }
 
-bool HttpServer::stop(std::chrono::seconds patience) {
+unsigned HttpServer::stop(std::chrono::seconds patience) {
   constexpr std::chrono::seconds sending(1);
+  stopping_ = true;
   (void)MHD_quiesce_daemon(daemon_);  // the socket's owner closes it
   socket_.refuseFurther();
-  if (!working_.waitForNone(patience)) return false;
+  if (const unsigned working = working_.waitForNone(patience)) return working;
   (void)unfinished_.waitForNone(sending);  // those who do not read are cut off
   MHD_stop_daemon(std::exchange(daemon_, nullptr));
-  return true;
+  return 0;
 }
 
 }  // namespace vmqd

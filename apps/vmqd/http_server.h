@@ -3,6 +3,7 @@
 
 #include <sys/types.h>
 
+#include <atomic>
 #include <chrono>
 #include <functional>
 #include <memory>
@@ -35,13 +36,11 @@ class HttpServer {
   HttpServer(const HttpServer&) = delete;
   HttpServer& operator=(const HttpServer&) = delete;
 
-  /// Takes no more clients, waits up to `patience` for the answers that are being worked out and a second more for
-  /// those that are being sent, and closes every connection. False when an answer is still being worked out: its
-  /// thread cannot be ended, and the process has to exit around it. Streams must have been told to end before.
-  [[nodiscard]] bool stop(std::chrono::seconds patience);
-
-  /// How many answers are being worked out.
-  [[nodiscard]] unsigned working() const { return working_.count(); }
+  /// Takes no more clients and requests, waits up to `patience` for the answers that are being worked out and a second
+  /// more for those that are being sent, and closes every connection. Returns 0, or how many answers are still being
+  /// worked out: their threads cannot be ended, and the process has to exit around them. Streams must have been told to
+  /// end before.
+  [[nodiscard]] unsigned stop(std::chrono::seconds patience);
 
  private:
   friend class HttpConnection;
@@ -50,6 +49,7 @@ class HttpServer {
   const AdmittedUsers users_;
   const HttpLimits limits_;
   const Answer answer_;
+  std::atomic<bool> stopping_{false};
   Activity connections_;
   Activity working_;     // in answer_
   Activity unfinished_;  // from answer_ until the reply has been sent

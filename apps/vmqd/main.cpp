@@ -3,6 +3,7 @@
 #include <limits.h>
 #include <signal.h>
 #include <sys/eventfd.h>
+#include <sys/resource.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -38,8 +39,9 @@ sigset_t blockSignals() {
   sigaddset(&ending, SIGINT);
   sigset_t blocked = ending;
   sigaddset(&blocked, SIGPIPE);
-  if (const int error = pthread_sigmask(SIG_BLOCK, &blocked, nullptr))
+  if (const int error = pthread_sigmask(SIG_BLOCK, &blocked, nullptr)) {
     throw std::runtime_error(withReason("signals", error));
+  }
   return ending;
 }
 
@@ -62,6 +64,16 @@ std::vector<uid_t> guestsOf(const Configuration& configuration) {
   guests.erase(std::remove_if(guests.begin(), guests.end(), [](uid_t user) { return user == 0 || user == geteuid(); }),
                guests.end());
   return guests;
+}
+
+/// Every client takes a descriptor and every watcher one more; the component takes some for each program it runs.
+void warnOfTooFewDescriptors(unsigned maximum_connections) {
+  constexpr rlim_t others = 64;
+  const rlim_t needed = rlim_t{maximum_connections} * 2 + others;
+  rlimit limit{};
+  if (getrlimit(RLIMIT_NOFILE, &limit) != 0 || limit.rlim_cur >= needed) return;
+  logWarning("maximum_connections may take " + std::to_string(needed) + " descriptors, but the process has only " +
+             std::to_string(limit.rlim_cur));
 }
 
 void warn(const Service& service) {
@@ -98,6 +110,7 @@ int run(const Configuration& configuration) {
 
   Service service(settings, vmqhost::listTables());
   warn(service);
+  warnOfTooFewDescriptors(configuration.maximum_connections);
   HttpServer server(socket, AdmittedUsers(configuration.allowed_uids),
                     {configuration.maximum_request_bytes, configuration.maximum_connections},
                     [&service](Request& request, Reply& reply) { answer(service, request, reply); });
@@ -107,13 +120,14 @@ int run(const Configuration& configuration) {
   logLine(std::string("stopping: ") + waitForEnding(ending));
   tell(manager, "STOPPING=1");
   (void)eventfd_write(stop.get(), 1);
-  if (server.stop(std::chrono::seconds(configuration.stop_seconds))) {
-    logLine("stopped");
-    return 0;
+  const unsigned working = server.stop(std::chrono::seconds(configuration.stop_seconds));
+  if (working > 0) {
+    logWarning("stopped; queries that still run, and will not be answered: " + std::to_string(working));
+    socket.remove();
+    _exit(0);
   }
-  logWarning("stopped without waiting for " + std::to_string(server.working()) + " queries that still run");
-  socket.remove();
-  _exit(0);
+  logLine("stopped");
+  return 0;
 }
 
 }  // namespace

@@ -1,6 +1,7 @@
 // How a daemon starts and ends, and what stands in its way.
 
 #include <gmock/gmock.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -205,7 +206,26 @@ TEST(Stop, DoesNotWaitForeverForAQuery) {
   EXPECT_EQ(0, daemon.stop());
   EXPECT_TRUE(client.hungUp());
   EXPECT_FALSE(fs::exists(daemon.socket()));
-  EXPECT_THAT(daemon.log(), HasSubstr("vmqd: warning: stopped without waiting for 1 queries that still run\n"));
+  EXPECT_THAT(daemon.log(), HasSubstr("vmqd: warning: stopped; queries that still run, and will not be answered: 1\n"));
+}
+
+TEST(Stop, TakesNoMoreRequestsOnOpenConnections) {
+  TestDaemon daemon({"stop_seconds = 3600"});
+  Gate gate(daemon.directory() / "gate");
+  HttpClient client(daemon.socket());
+  HttpClient other(daemon.socket());
+  ASSERT_EQ(200, other.get("/v1/health").status);
+  std::thread asking([&] { EXPECT_EQ(200, client.post("/v1/tables/GATE/query", gate.query()).status); });
+  gate.waitForQuery();
+  daemon.process().signal(SIGTERM);
+  EXPECT_EQ("STOPPING=1", daemon.process().nextNotification());
+  HttpReply reply = other.get("/v1/health");
+  while (reply.status == 200) reply = other.get("/v1/health");  // told a moment before it is done
+  EXPECT_EQ(503, reply.status);
+  EXPECT_EQ("busy", errorCode(reply));
+  gate.open();
+  asking.join();
+  EXPECT_EQ(0, daemon.process().wait());
 }
 
 TEST(Stop, TakesNoMoreClients) {
@@ -307,6 +327,18 @@ TEST(Start, WarnsWhenDepotAndHomeAreOnDifferentFileSystems) {
   daemon.start();
   EXPECT_THAT(daemon.log(), HasSubstr("vmqd: warning: the depot /proc/depot/that/is/not/there and the home " +
                                       daemon.home() + " are on different file systems"));
+}
+
+TEST(Start, WarnsWhenConnectionsMayRunOutOfDescriptors) {
+  rlimit before{};
+  ASSERT_EQ(0, getrlimit(RLIMIT_NOFILE, &before));
+  const rlimit few{500, before.rlim_max};
+  ASSERT_EQ(0, setrlimit(RLIMIT_NOFILE, &few));
+  const TestDaemon daemon;
+  ASSERT_EQ(0, setrlimit(RLIMIT_NOFILE, &before));
+  EXPECT_THAT(daemon.log(),
+              HasSubstr("vmqd: warning: maximum_connections may take 576 descriptors, but the process has "
+                        "only 500\n"));
 }
 
 TEST(Start, DoesNotWarnWhenAllIsWell) {
