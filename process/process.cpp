@@ -16,6 +16,8 @@ namespace {
 
 RAS1_Unit traceUnit{"process/process"};
 
+constexpr int kDefaultTimeoutSeconds = 300;
+
 const char* firstOf(const char** list) {
   return list != nullptr ? list[0] : nullptr;
 }
@@ -69,9 +71,12 @@ Process::~Process() {
 
 void Process::init(String command, const char** env, const char** second, const char** third) {
   const Trace trace(traceUnit);
-  command_ = command;
+  command_ = std::move(command);
+  environment_.clear();
   for (; env != nullptr && *env != nullptr; ++env) environment_.emplace_back(*env);
   const char* const timeout = BSS1_GetEnv("TIMEOUT", nullptr);
+  timeout_ = kDefaultTimeoutSeconds;
+  timeoutIsSet_ = false;
   int seconds = 0;
   // An empty text would convert to 0.
   if (timeout != nullptr && *timeout != '\0' && String::convertToInt(String(timeout), &seconds)) {

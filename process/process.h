@@ -33,6 +33,12 @@ class Process {
   /// Closes the streams. A child that still runs goes on; its waiter thread reaps it.
   ~Process();
 
+  /// What the constructors do: takes the command and its settings, in place of those there were, and reads TIMEOUT.
+  /// REQUIRES: not started.
+  void init(String command, const char** env, const char** second, const char** third);
+  /// What the constructors do: makes the streams, closed. REQUIRES: not started.
+  void createStreams();
+
   /// Starts the child. False, with the trace "Unable to execute command: %s", when its first word is not an executable
   /// path, the line has more than 127 words, or the system refuses a pipe, a thread or the child; then nothing is left
   /// behind. The first word is not looked up in PATH by that check.
@@ -70,8 +76,6 @@ class Process {
   [[nodiscard]] int completionDescriptor() const { return processData_->completion.get(); }
 
  private:
-  void init(String command, const char** env, const char** second, const char** third);
-  void createStreams();
   bool startChild();
   bool waitForCompletion(int64_t killAtMilliseconds, bool* killed);
   bool killChild();
@@ -82,7 +86,7 @@ class Process {
 
   String command_;
   std::vector<std::string> environment_;
-  int timeout_ = 300;
+  int timeout_ = 0;  ///< seconds
   bool timeoutIsSet_ = false;
   std::unique_ptr<user_s_t, FreeToken> userToken_;
   std::unique_ptr<ProcessOutputStream> stdIn_;

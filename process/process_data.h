@@ -21,7 +21,7 @@ struct ProcessData {
 
   // Constant once the waiter thread exists.
   int pid = -1;
-  int timeout = 300;  ///< seconds that Process::wait gives the child
+  int timeout = 0;  ///< seconds that Process::wait gives the child
   /// Becomes readable when `completed` is set, so that one poll can wait for output and for the end of the child.
   Descriptor completion;
 

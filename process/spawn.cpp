@@ -9,6 +9,7 @@
 #include <cerrno>
 #include <csignal>
 #include <cstring>
+#include <utility>
 
 #include "process/child_entry.h"
 #include "process/signal_guards.h"
@@ -82,22 +83,21 @@ void traceChild(const Trace& trace, pid_t pid, const ChildLaunch& launch) {
   }
 }
 
-/// 0, or an errno value.
-int startWaiter(const std::shared_ptr<ProcessData>& processData) {
+/// Gives the waiter thread its share of the record. 0, or an errno value.
+int startWaiter(std::unique_ptr<std::shared_ptr<ProcessData>> share) {
+  ProcessData& processData = **share;
   pthread_attr_t attributes;
   int rc = pthread_attr_init(&attributes);
   if (rc != 0) return rc;
   (void)pthread_attr_setstacksize(&attributes, kWaiterStackBytes);  // refused where it is too small: then the default
-  auto handle = std::make_unique<std::shared_ptr<ProcessData>>(processData);
   {
     // The host's signals are for the host's threads.
     const AllSignalsBlocked blocked;
-    rc = pthread_create(&processData->thread, &attributes, ProcTerminateThreadFunc, handle.get());
+    rc = pthread_create(&processData.thread, &attributes, ProcTerminateThreadFunc, share.get());
   }
   (void)pthread_attr_destroy(&attributes);
   if (rc != 0) return rc;
-  (void)handle.release();  // the waiter's from now on
-  processData->joinable = true;
+  (void)share.release();  // the waiter's from now on
   return 0;
 }
 
@@ -157,6 +157,8 @@ bool forkAndExecute(char** argv, const char* const* env, const std::shared_ptr<P
   launch.environment = environment.entries();
   launch.descriptorLimit = static_cast<int>(sysconf(_SC_OPEN_MAX));
 
+  // Made before there is a child that nothing would wait for if this failed.
+  auto share = std::make_unique<std::shared_ptr<ProcessData>>(processData);
   const pid_t pid = launchChild(launch);
   if (pid < 0) {
     const int error = errno;
@@ -171,13 +173,14 @@ bool forkAndExecute(char** argv, const char* const* env, const std::shared_ptr<P
   stdoutPipe.writeEnd.reset();
   stderrPipe.writeEnd.reset();
 
-  const int error = startWaiter(processData);
+  const int error = startWaiter(std::move(share));
   if (error != 0) {
     TRACE_ERROR(trace, "Error creating thread to wait on process");
     TRACE_ERRNO(trace, error);
     killAndReap(pid);
     return false;
   }
+  processData->joinable = true;
   return true;
 }
 
