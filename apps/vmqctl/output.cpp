@@ -124,6 +124,18 @@ std::string record(const Json& object, const Layout& layout) {
   return text;
 }
 
+std::string linesText(std::string_view text, const Stream& stream) {
+  if (!stream.terminal) return std::string(text);
+  std::string shown;
+  for (;;) {
+    const std::size_t end = text.find('\n');
+    shown += escaped(text.substr(0, end), stream.charset);
+    if (end == std::string_view::npos) return shown;
+    shown += '\n';
+    text.remove_prefix(end + 1);
+  }
+}
+
 std::string jsonText(const Json& value, bool oneLine, const Stream& stream) {
   return value.dump(oneLine ? -1 : 2, ' ', /*ensure_ascii=*/stream.terminal, Json::error_handler_t::replace) + "\n";
 }

@@ -31,6 +31,9 @@ std::string record(const Json& object, const Layout& layout);
 /// The text of a value as tables show it, not escaped.
 std::string plain(const Json& value);
 
+/// A text of several lines: byte for byte, but on a terminal with everything but the line ends escaped.
+std::string linesText(std::string_view text, const Stream& stream);
+
 /// JSON text, a line end behind it. On a terminal everything above ASCII is escaped.
 std::string jsonText(const Json& value, bool oneLine, const Stream& stream);
 

@@ -134,7 +134,8 @@ void buildGetConfig(Request& request, const Arguments& a) {
   request.shows = [](const Console& console, const Json& answer) {
     const std::string configuration = textIn(answer, "CONTEXT");
     if (configuration.empty()) console.line("There is no configuration.");
-    console.data(configuration.empty() || configuration.back() == '\n' ? configuration : configuration + "\n");
+    const bool ended = configuration.empty() || configuration.back() == '\n';
+    console.data(linesText(ended ? configuration : configuration + "\n", console.out()));
     if (configuration.size() >= contextColumnBytes)
       console.line("The configuration fills its column and may go on: what an answer holds ends here.");
   };

@@ -99,6 +99,16 @@ TEST_F(Output, RecordGoesOnInTheNextLineWhenTheWidthIsLimited) {
   EXPECT_EQ(record({{"A", "0123456789abcdef"}}, {}), "A  0123456789abcdef\n");
 }
 
+TEST_F(Output, LinesGoToAFileAsTheyAreAndToATerminalEscaped) {
+  const std::string text = "A=1\r\n\n\x1b[2JB=\t\xC3\xBC\\";
+  vmqctl::Stream stream;
+  EXPECT_EQ(linesText(text, stream), text);
+  stream.terminal = true;
+  EXPECT_EQ(linesText(text, stream), "A=1\\r\n\n\\x1b[2JB=\\t\xC3\xBC\\\\");
+  EXPECT_EQ(linesText("", stream), "");
+  EXPECT_EQ(linesText("A\n", stream), "A\n");
+}
+
 TEST_F(Output, JsonKeepsTheOrderOfItsMembers) {
   const Json value = {{"b", 1}, {"a", "\xC3\xBC\x1b"}};
   vmqctl::Stream file;
