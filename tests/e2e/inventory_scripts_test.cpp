@@ -1,6 +1,7 @@
 // The other tools of the sample home: the inventory, the architecture probe and the two-way translator.
 
 #include <gmock/gmock.h>
+#include <signal.h>
 
 #include <filesystem>
 
@@ -52,6 +53,33 @@ TEST_F(SampleTools, InventoryTakesAnEmptyLastArgument) {
 
 TEST_F(SampleTools, InventoryRefusesWhatItDoesNotUnderstand) {
   for (const char* arguments : {"", "-z", "-d ux", "-p"}) EXPECT_EQ(inventory(arguments).exit_code, 64) << arguments;
+}
+
+TEST_F(SampleTools, UninstallEndsTheAgentsAndTakesTheProductOutOfTheInventory) {
+  ASSERT_EQ(home.control("start ux").exit_code, 0);
+  ASSERT_EQ(home.control("-o inst1 start ux").exit_code, 0);
+  const Outcome outcome = runShell(quoted(home / "bin/uninstall.sh") + " -i ux lx8266");
+  EXPECT_EQ(outcome.exit_code, 0) << outcome.output;
+  EXPECT_EQ(home.control("status ux").exit_code, 3);
+  EXPECT_EQ(home.control("-o inst1 status ux").exit_code, 3);
+  EXPECT_THAT(inventory("-d").output, testing::Not(HasSubstr("\"ux\"")));
+}
+
+TEST_F(SampleTools, UninstallKeepsAProductWhoseAgentCannotBeStopped) {
+  ASSERT_EQ(home.control("start ux").exit_code, 0);
+  home.configure("ux", "WAIT_SECONDS=1");
+  ASSERT_EQ(kill(home.pid("ux").value(), SIGSTOP), 0);
+  const Outcome outcome = runShell(quoted(home / "bin/uninstall.sh") + " -i ux lx8266");
+  EXPECT_EQ(outcome.exit_code, 1);
+  EXPECT_THAT(outcome.output, HasSubstr("ux is still running"));
+  EXPECT_THAT(inventory("-d").output, HasSubstr("\"ux\""));
+}
+
+TEST_F(SampleTools, UninstallRefusesWhatIsNotInstalledAndWhatItDoesNotUnderstand) {
+  for (const char* arguments : {"-i ux aix433", "-i ax lx8266", "-i lz lx8266"})
+    EXPECT_EQ(runShell(quoted(home / "bin/uninstall.sh") + " " + arguments).exit_code, 1) << arguments;
+  for (const char* arguments : {"", "-i ux", "-x ux lx8266", "-i ux lx8266 now"})
+    EXPECT_EQ(runShell(quoted(home / "bin/uninstall.sh") + " " + arguments).exit_code, 64) << arguments;
 }
 
 TEST_F(SampleTools, ArchitectureProbeSetsBothVariables) {
