@@ -68,7 +68,7 @@ typedef uint32_t RES1_Handle;
 /// Gives back one use of a handle. Returns 0, or ENOENT for a handle that is not in use.
 unsigned RES1_Drop(RES1_Handle handle);
 
-/// The node name of this host agent. Static text, set once by the process that owns the host library.
+/// The node name of this host agent. Static text, set once by the process that owns the host library; empty before.
 const char* IRA_GetOriginnode();
 
 class bxira {

@@ -34,15 +34,20 @@ std::string_view columnText(const char* text, unsigned width) {
   return all.substr(0, all.find_last_not_of('\0') + 1);
 }
 
-unsigned char at(std::string_view text, size_t index) {
-  return static_cast<unsigned char>(index < text.size() ? text[index] : ' ');
+/// How a text compares with as many blanks. A wide column is mostly padding: that it is the same as itself one byte
+/// further on is found faster than byte by byte.
+std::strong_ordering compareWithBlanks(std::string_view text) {
+  if (text.empty()) return std::strong_ordering::equal;
+  if (text[0] == ' ' && std::memcmp(text.data(), text.data() + 1, text.size() - 1) == 0)
+    return std::strong_ordering::equal;
+  return static_cast<unsigned char>(text[text.find_first_not_of(' ')]) <=> static_cast<unsigned char>(' ');
 }
 
 std::strong_ordering comparePadded(std::string_view left, std::string_view right) {
-  for (size_t i = 0; i < std::max(left.size(), right.size()); ++i) {
-    if (const auto order = at(left, i) <=> at(right, i); order != 0) return order;
-  }
-  return std::strong_ordering::equal;
+  const size_t common = std::min(left.size(), right.size());
+  if (const int order = std::memcmp(left.data(), right.data(), common); order != 0) return order <=> 0;
+  if (left.size() > common) return compareWithBlanks(left.substr(common));
+  return 0 <=> compareWithBlanks(right.substr(common));
 }
 
 }  // namespace

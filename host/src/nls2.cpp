@@ -78,8 +78,10 @@ NLS2_Locale* currentLocale() {
   return newLocale(0, vmqhost::newIconvConverter(name, static_cast<uint32_t>(std::max<size_t>(MB_CUR_MAX, 1))));
 }
 
+/// Made when the library is loaded, so that no conversion can fail for want of memory.
+const Converter& latin1 = *vmqhost::newLatin1Converter().release();
+
 const Converter& converterOf(const NLS2_Locale* locale) {
-  static const Converter& latin1 = *vmqhost::newLatin1Converter().release();
   return locale == nullptr ? latin1 : *locale->converter;
 }
 

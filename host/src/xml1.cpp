@@ -111,7 +111,9 @@ void XML1_SetCharacterDataHandler(XML1_Parser* parser, XML1_CharacterDataHandler
 
 void* XML1_GetBuffer(XML1_Parser* parser, int length) {
   if (int status; vmqhost::seam::fails("XML1_GetBuffer", &status)) return nullptr;
-  return parser == nullptr ? nullptr : XML_GetBuffer(parser->expat, length);
+  if (parser == nullptr) return nullptr;
+  // Some expat 2.5 have no buffer of no bytes, and then nothing to parse an empty document from.
+  return XML_GetBuffer(parser->expat, length == 0 ? 1 : length);
 }
 
 int XML1_ParseBuffer(XML1_Parser* parser, int length, int isFinal) {

@@ -150,14 +150,16 @@ int calls = 0;
 BSS1_Once innerOnce = BSS1_ONCE_INIT;
 
 TEST(Once, RunsTheFirstTimeOnly) {
-  BSS1_Once once = BSS1_ONCE_INIT;
+  static BSS1_Once once;
+  once = BSS1_ONCE_INIT;  // also when the test runs again
   calls = 0;
   for (int i = 0; i < 3; ++i) EXPECT_EQ(BSS1_InitializeOnce(&once, [] { ++calls; }), 0);
   EXPECT_EQ(calls, 1);
 }
 
 TEST(Once, MayNeedAnother) {
-  BSS1_Once outer = BSS1_ONCE_INIT;
+  static BSS1_Once outer;
+  outer = BSS1_ONCE_INIT;  // also when the test runs again
   innerOnce = BSS1_ONCE_INIT;
   calls = 0;
   EXPECT_EQ(BSS1_InitializeOnce(&outer,
@@ -170,7 +172,8 @@ TEST(Once, MayNeedAnother) {
 }
 
 TEST(Once, KeepsAnExceptionAndDoesNotRunAgain) {
-  BSS1_Once once = BSS1_ONCE_INIT;
+  static BSS1_Once once;
+  once = BSS1_ONCE_INIT;  // also when the test runs again
   calls = 0;
   EXPECT_EQ(BSS1_InitializeOnce(&once,
                                 [] {
@@ -183,7 +186,8 @@ TEST(Once, KeepsAnExceptionAndDoesNotRunAgain) {
 }
 
 TEST(Once, RefusesNull) {
-  BSS1_Once once = BSS1_ONCE_INIT;
+  static BSS1_Once once;
+  once = BSS1_ONCE_INIT;  // also when the test runs again
   EXPECT_EQ(BSS1_InitializeOnce(nullptr, [] {}), EINVAL);
   EXPECT_EQ(BSS1_InitializeOnce(&once, nullptr), EINVAL);
 }

@@ -111,7 +111,8 @@ TEST(TimedWaitThreads, WakeOnTheSignal) {
 std::atomic<int> initialisations = 0;
 
 TEST(OnceThreads, WaitForTheOneThatInitialises) {
-  BSS1_Once once = BSS1_ONCE_INIT;
+  static BSS1_Once once;
+  once = BSS1_ONCE_INIT;  // also when the test runs again
   initialisations = 0;
   std::vector<std::thread> threads;
   for (int i = 0; i < 4; ++i) {

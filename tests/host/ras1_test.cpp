@@ -26,7 +26,6 @@ using testing::MatchesRegex;
 
 constinit RAS1_Unit unit{"tests/sample"};
 
-template <class... Arguments>
 void traceText(const std::string& text) {
   RAS1_Printf(&unit, RAS1_DETAIL, 7, "routine", "%s", text.c_str());
 }
