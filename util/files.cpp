@@ -30,6 +30,11 @@ bool isDirectory(const char* path) {
   return std::filesystem::is_directory(path, ignored);
 }
 
+// Why a stream is in error, for calls made with errno cleared.
+int errorOfStream() {
+  return errno != 0 ? errno : EIO;
+}
+
 // ---- createDir ---------------------------------------------------------------------------------------------------
 
 constexpr mode_t directoryMode = 0770;  // before the umask; on purpose
@@ -47,8 +52,7 @@ int makeDirectory(const Trace& trace, const char* path, const char* announcement
 
 // ---- readFile ----------------------------------------------------------------------------------------------------
 
-/// Opens for reading and says how long the file is now. A directory is refused: the C library opens it and reports a
-/// length of its own invention. 0, or an errno value.
+/// A directory is refused: the C library opens it and reports a length of its own invention. 0, or an errno value.
 int openForReading(const char* path, FILE** stream) {
   *stream = std::fopen(path, "rbe");
   if (*stream == nullptr) return errno;
@@ -81,7 +85,7 @@ int readStream(const Trace& trace, FILE* stream, const char* path, char** conten
   }
   errno = 0;
   const size_t count = std::fread(buffer.get(), 1, static_cast<size_t>(length), stream);
-  if (std::ferror(stream) != 0) return errno != 0 ? errno : EIO;
+  if (std::ferror(stream) != 0) return errorOfStream();
   if (count == 0) return 0;
   buffer.get()[count] = '\0';  // behind what came: the file may have been cut meanwhile
   *contents = buffer.release();
@@ -92,10 +96,6 @@ int readStream(const Trace& trace, FILE* stream, const char* path, char** conten
 // ---- copying -----------------------------------------------------------------------------------------------------
 
 constexpr size_t copyBlockBytes = 1024;
-
-int errorOfStream() {
-  return errno != 0 ? errno : EIO;
-}
 
 bool isSameFile(FILE* open, const std::string& path) {
   struct stat one;
@@ -126,6 +126,7 @@ int copyStream(const Trace& trace, FILE* from, FILE* to, const String& source, c
 }
 
 int closeStream(const Trace& trace, FILE* stream, const String& path) {
+  errno = 0;
   if (std::fclose(stream) == 0) return 0;
   const int error = errorOfStream();
   TRACE_ERROR(trace, "Failed to close stream for file %s, error code: %s", path.c_str().get(), std::strerror(error));

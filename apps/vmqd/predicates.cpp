@@ -33,6 +33,7 @@ bool isInteger(std::string_view text) {
 Predicates::Predicates(const Table& table) : table_(table) {
   request_.application = table.description.application;
   request_.table = table.description.table;
+  request_.predicates.reserve(16);
 }
 
 _IntfOper Predicates::operatorNamed(std::string_view column, std::string_view name) {

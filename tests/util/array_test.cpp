@@ -372,8 +372,8 @@ INSTANTIATE_TEST_SUITE_P(
 TEST(ArrayTest, EmptyArrayHasNoElement) {
   Array<long> array;
   testing::internal::CaptureStdout();
-  EXPECT_RANGE_ERROR(array[0]);
-  EXPECT_RANGE_ERROR(array.remove(0));
+  EXPECT_THROW(array[0], VMQ::IndexOutOfBoundsException);
+  EXPECT_THROW(array.remove(0), VMQ::IndexOutOfBoundsException);
   (void)testing::internal::GetCapturedStdout();
 }
 

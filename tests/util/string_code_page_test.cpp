@@ -170,6 +170,18 @@ TEST_F(StringCodePage, NarrowCopyHasOneByteForEachUnitAndTheTerminator) {
   std::_Exit(service().calls == Texts{"from 2 2", "to 2 2"} ? 0 : 4);  // and keeps it
 }
 
+[[noreturn]] void initializeBeforeTheFirstConversion() {
+  String::initialize();
+  service().calls.clear();
+  (void)String("a");
+  std::_Exit(service().calls == Texts{"release 1208", "get current", "to 2 2"} ? 0 : 1);
+}
+
+TEST(StringFirstConversionTest, MakesTheChoiceEvenWhenItWasMadeBefore) {
+  GTEST_FLAG_SET(death_test_style, "threadsafe");
+  EXPECT_EXIT(initializeBeforeTheFirstConversion(), testing::ExitedWithCode(0), "");
+}
+
 TEST(StringFirstConversionTest, ChoosesTheLocaleOnceAndAgainOnlyWhenThatFailed) {
   // Starts this program again, for this test alone.
   GTEST_FLAG_SET(death_test_style, "threadsafe");

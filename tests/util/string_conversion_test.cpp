@@ -191,6 +191,7 @@ TEST(StringConversionTest, ChosenCodePageIsTraced) {
 }
 
 TEST(StringConversionTest, WithoutALocaleTextIsConvertedAsLatin1) {
+  const String first("later conversions make do with what there is");
   {
     const TEST_FailCall failing("NLS2_GetLocale", 1, 0);
     EXPECT_FALSE(String::initialize());

@@ -136,6 +136,9 @@ TEST(StringTest, PieceOfATextCanBeAssignedToIt) {
   EXPECT_EQ(text.assign(text.getData() + 2), "cdef");
   EXPECT_EQ(text.assign(text.getData() + 1, 2u), "de");
   EXPECT_EQ(unitsOf(text.assign(text.getData(), 3u)), (Units{'d', 'e', 0}));
+  String full(String("abcdef"), 6u);
+  full = String(full);  // a copy has no room to spare
+  EXPECT_EQ(unitsOf(full.assign(full.getData(), 7u)), (Units{'a', 'b', 'c', 'd', 'e', 'f', 0}));
   String large;
   for (int i = 0; i < 10000; ++i) large.append(static_cast<unsigned short>('a' + i % 26));
   EXPECT_EQ(large.assign(large.getData() + 26, 3u), "abc");
