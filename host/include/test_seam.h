@@ -33,10 +33,9 @@ class TEST_TraceCapture {
   void clear();
 };
 
-/// Replaces the passing of time: BSS1_Sleep records its seconds, moves the clocks (BSS1_GetTime, BSS1_GetElapsed)
-/// forward by them and returns at once; BSS1_TimedWait waits a few real milliseconds for its signal, then moves the
-/// clocks forward by its whole time and returns ETIMEDOUT. In between, the clocks run on as usual. At the end
-/// BSS1_GetTime is back at the real time; BSS1_GetElapsed, which never steps back, keeps its lead.
+/// Replaces sleeping: BSS1_Sleep records its seconds, moves the clocks (BSS1_GetTime, BSS1_GetElapsed) forward by them and
+/// returns at once. In between, the clocks run on as usual. At the end BSS1_GetTime is back at the real time;
+/// BSS1_GetElapsed, which never steps back, keeps its lead.
 class TEST_RecordedSleeps {
  public:
   TEST_RecordedSleeps();
@@ -44,8 +43,20 @@ class TEST_RecordedSleeps {
   TEST_RecordedSleeps(const TEST_RecordedSleeps&) = delete;
   TEST_RecordedSleeps& operator=(const TEST_RecordedSleeps&) = delete;
 
-  [[nodiscard]] std::vector<unsigned> seconds() const;            ///< of each BSS1_Sleep, in order
-  [[nodiscard]] std::vector<int64_t> waitedMilliseconds() const;  ///< of each BSS1_TimedWait that timed out
+  [[nodiscard]] std::vector<unsigned> seconds() const;  ///< of each BSS1_Sleep, in order
+};
+
+/// Replaces waiting: BSS1_TimedWait waits a few real milliseconds for its signal, then moves the clocks forward, as
+/// TEST_RecordedSleeps does, by its whole time and returns ETIMEDOUT. For tests of what happens when time is up: on a busy
+/// machine a child hardly begins in those milliseconds.
+class TEST_RecordedWaits {
+ public:
+  TEST_RecordedWaits();
+  ~TEST_RecordedWaits();
+  TEST_RecordedWaits(const TEST_RecordedWaits&) = delete;
+  TEST_RecordedWaits& operator=(const TEST_RecordedWaits&) = delete;
+
+  [[nodiscard]] std::vector<int64_t> milliseconds() const;  ///< of each BSS1_TimedWait that timed out, in order
 };
 
 /// Makes one call of a service fail: the n-th from now on (n = 1: the next). Services are named like their functions,

@@ -16,7 +16,7 @@ constexpr int64_t kMillisecondsPerSecond = 1000;
 constexpr int64_t kNanosecondsPerMillisecond = 1'000'000;
 /// Longer waits are cut to this (about 30 years), so that a deadline never overflows.
 constexpr int64_t kLongestWaitMilliseconds = int64_t{1'000'000} * 1'000'000;
-/// What a wait gets of real time while sleeps are recorded.
+/// What a wait gets of real time while waits are recorded.
 constexpr int64_t kRecordedWaitMilliseconds = 5;
 
 /// REQUIRES: a clock that every supported system has, so that reading it cannot fail.
@@ -67,7 +67,7 @@ void BSS1_Sleep(unsigned seconds) {
 }
 
 int BSS1_TimedWait(pthread_cond_t* condition, pthread_mutex_t* mutex, int64_t milliseconds) {
-  if (!seam::sleepsRecorded.load(std::memory_order_relaxed)) [[likely]]
+  if (!seam::waitsRecorded.load(std::memory_order_relaxed)) [[likely]]
     return waitOnce(condition, mutex, milliseconds);
   const int result = waitOnce(condition, mutex, std::min(milliseconds, kRecordedWaitMilliseconds));
   if (result == ETIMEDOUT) seam::recordTimedOutWait(milliseconds);

@@ -20,6 +20,7 @@ extern constinit std::atomic<bool> captureActive;
 // ---- passing of time -------------------------------------------------------------------------------------------
 
 extern constinit std::atomic<bool> sleepsRecorded;
+extern constinit std::atomic<bool> waitsRecorded;
 /// How far the clocks have been moved forward, in milliseconds.
 extern constinit std::atomic<int64_t> wallClockAhead;
 extern constinit std::atomic<int64_t> elapsedClockAhead;  ///< never taken back, because that clock never steps back

@@ -18,6 +18,7 @@ namespace vmqhost::seam {
 
 constinit std::atomic<bool> captureActive{false};
 constinit std::atomic<bool> sleepsRecorded{false};
+constinit std::atomic<bool> waitsRecorded{false};
 constinit std::atomic<int64_t> wallClockAhead{0};
 constinit std::atomic<int64_t> elapsedClockAhead{0};
 constinit std::atomic<bool> failureArmed{false};
@@ -138,14 +139,13 @@ void TEST_TraceCapture::clear() {
 TEST_RecordedSleeps::TEST_RecordedSleeps() {
   const std::lock_guard held(seam::mutex);
   seam::records().sleeps.clear();
-  seam::records().waits.clear();
   seam::sleepsRecorded = true;
 }
 
 TEST_RecordedSleeps::~TEST_RecordedSleeps() {
   const std::lock_guard held(seam::mutex);
   seam::sleepsRecorded = false;
-  seam::wallClockAhead = 0;
+  if (!seam::waitsRecorded) seam::wallClockAhead = 0;
 }
 
 std::vector<unsigned> TEST_RecordedSleeps::seconds() const {
@@ -153,7 +153,19 @@ std::vector<unsigned> TEST_RecordedSleeps::seconds() const {
   return seam::records().sleeps;
 }
 
-std::vector<int64_t> TEST_RecordedSleeps::waitedMilliseconds() const {
+TEST_RecordedWaits::TEST_RecordedWaits() {
+  const std::lock_guard held(seam::mutex);
+  seam::records().waits.clear();
+  seam::waitsRecorded = true;
+}
+
+TEST_RecordedWaits::~TEST_RecordedWaits() {
+  const std::lock_guard held(seam::mutex);
+  seam::waitsRecorded = false;
+  if (!seam::sleepsRecorded) seam::wallClockAhead = 0;
+}
+
+std::vector<int64_t> TEST_RecordedWaits::milliseconds() const {
   const std::lock_guard held(seam::mutex);
   return seam::records().waits;
 }

@@ -6,7 +6,9 @@
 #include <gtest/gtest.h>
 
 #include <cerrno>
+#include <chrono>
 #include <ctime>
+#include <thread>
 
 #include "bss1.h"
 #include "fsi1.h"
@@ -108,8 +110,8 @@ TEST(RecordedSleeps, RecordSleepsAndMoveTheClocks) {
   EXPECT_LT(BSS1_GetElapsed() - elapsed, 3605000 + 60000);
 }
 
-TEST(RecordedSleeps, RecordWaitsThatTimeOut) {
-  const TEST_RecordedSleeps sleeps;
+TEST(RecordedWaits, RecordWaitsThatTimeOut) {
+  const TEST_RecordedWaits waits;
   pthread_mutex_t mutex = PTHREAD_MUTEX_INITIALIZER;
   pthread_cond_t condition = PTHREAD_COND_INITIALIZER;
   const int64_t elapsed = BSS1_GetElapsed();
@@ -118,7 +120,7 @@ TEST(RecordedSleeps, RecordWaitsThatTimeOut) {
   while (result == 0) result = BSS1_TimedWait(&condition, &mutex, 300000);
   pthread_mutex_unlock(&mutex);
   EXPECT_EQ(result, ETIMEDOUT);
-  EXPECT_THAT(sleeps.waitedMilliseconds(), ElementsAre(300000));
+  EXPECT_THAT(waits.milliseconds(), ElementsAre(300000));
   EXPECT_GE(BSS1_GetElapsed() - elapsed, 300000);
 }
 
@@ -133,7 +135,22 @@ TEST(RecordedSleeps, EndWithTheWallClockRightAndTheElapsedClockNotBack) {
   EXPECT_GE(BSS1_GetElapsed(), elapsed);
   const TEST_RecordedSleeps again;
   EXPECT_TRUE(again.seconds().empty());
-  EXPECT_TRUE(again.waitedMilliseconds().empty());
+}
+
+TEST(RecordedSleeps, LeaveTimedWaitsTheirRealTime) {
+  const TEST_RecordedSleeps sleeps;
+  pthread_mutex_t mutex = PTHREAD_MUTEX_INITIALIZER;
+  pthread_cond_t condition = PTHREAD_COND_INITIALIZER;
+  pthread_mutex_lock(&mutex);
+  std::thread signals([&] {
+    std::this_thread::sleep_for(std::chrono::milliseconds(50));  // longer than a recorded wait
+    pthread_mutex_lock(&mutex);
+    pthread_cond_signal(&condition);
+    pthread_mutex_unlock(&mutex);
+  });
+  EXPECT_EQ(BSS1_TimedWait(&condition, &mutex, 300000), 0);
+  pthread_mutex_unlock(&mutex);
+  signals.join();
 }
 
 // ---- failing calls -----------------------------------------------------------------------------------------------

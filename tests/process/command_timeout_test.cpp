@@ -23,6 +23,7 @@ class CommandTimeout : public CommandFixture {
   }
 
   const TEST_RecordedSleeps sleeps;
+  const TEST_RecordedWaits waits;
   const TEST_TraceCapture traces;
   const KillRecord record;
 };
@@ -49,7 +50,7 @@ TEST_F(CommandTimeout, SetTimeoutBoundsASilentCommand) {
   const Result result = run(scriptThatWaits("echo begun"));
   expectKilled(result);
   EXPECT_EQ(result.out, "begun\n");
-  EXPECT_EQ(sleeps.waitedMilliseconds().size(), 1u) << "the time spent reading counts";
+  EXPECT_EQ(waits.milliseconds().size(), 1u) << "the time spent reading counts";
   letGo();
 }
 
@@ -79,21 +80,21 @@ TEST_F(CommandTimeout, SetTimeoutIsBoundedFromTheStartNotFromTheWait) {
                  "while [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done"));
   time.join();
   expectKilled(result);
-  EXPECT_EQ(sleeps.waitedMilliseconds().size(), 1u);
+  EXPECT_EQ(waits.milliseconds().size(), 1u);
   letGo();
 }
 
 TEST_F(CommandTimeout, CommandThatClosesItsOutputsHasTheUsualTimeFromThenOn) {
   const Result result = run(script("exec >&- 2>&-; while [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done"));
   expectKilled(result);
-  EXPECT_EQ(sleeps.waitedMilliseconds().size(), 30u);
+  EXPECT_EQ(waits.milliseconds().size(), 30u);
   letGo();
 }
 
 TEST_F(CommandTimeout, AgentCommandHasTheUsualTime) {
   const Result result = run(agentScript("while [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done"));
   expectKilled(result);
-  EXPECT_EQ(sleeps.waitedMilliseconds().size(), 30u);
+  EXPECT_EQ(waits.milliseconds().size(), 30u);
   letGo();
 }
 
@@ -102,7 +103,7 @@ TEST_F(CommandTimeout, AgentCommandThatNeitherReadsNorEndsIsKilled) {
   const Result result =
       run(agentScript("while [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done"), std::string(size_t{1} << 20, 'x'));
   expectKilled(result);
-  EXPECT_EQ(sleeps.waitedMilliseconds().size(), 1u);
+  EXPECT_EQ(waits.milliseconds().size(), 1u);
   letGo();
 }
 

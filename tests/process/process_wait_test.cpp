@@ -91,7 +91,7 @@ TEST_F(ProcessWait, NothingToWaitForIsAFailure) {
 }
 
 TEST_F(ProcessWait, ChildThatOutlivesItsTimeoutIsKilled) {
-  const TEST_RecordedSleeps sleeps;
+  const TEST_RecordedWaits waits;
   const TEST_TraceCapture traces;
   const KillRecord record;
   Process process(scriptThatWaits("echo $$").c_str());
@@ -104,7 +104,7 @@ TEST_F(ProcessWait, ChildThatOutlivesItsTimeoutIsKilled) {
   EXPECT_TRUE(traces.has(RAS1_DETAIL, "Terminating process group -" + std::to_string(pid)));
   EXPECT_TRUE(traces.has(RAS1_DETAIL, "Terminating process " + std::to_string(pid)));
   EXPECT_TRUE(traces.has(RAS1_ERROR, "Error occurred. ERRNO:3 No such process"));  // it leads no group
-  EXPECT_EQ(sleeps.waitedMilliseconds(), std::vector<int64_t>(30, 10'000));
+  EXPECT_EQ(waits.milliseconds(), std::vector<int64_t>(30, 10'000));
   EXPECT_FALSE(process.running());
   letGo();
 }
@@ -114,19 +114,19 @@ TEST_F(ProcessWait, TimeoutIsRoundedUpToTheNextSlice) {
   for (const auto& [value, slices] : {std::pair("60", 6), std::pair("25", 3), std::pair("10", 1), std::pair("1", 1),
                                       std::pair("0", 1), std::pair("-5", 1)}) {
     const ScopedVariable timeout("TIMEOUT", value);
-    const TEST_RecordedSleeps sleeps;
+    const TEST_RecordedWaits waits;
     Process process(command.c_str());
     ASSERT_TRUE(process.start());
     int rc = 0;
     EXPECT_FALSE(process.wait(&rc));
     EXPECT_EQ(rc, 137);
-    EXPECT_EQ(sleeps.waitedMilliseconds().size(), static_cast<size_t>(slices)) << value;
+    EXPECT_EQ(waits.milliseconds().size(), static_cast<size_t>(slices)) << value;
   }
   letGo();
 }
 
 TEST_F(ProcessWait, ChildThatLeadsAGroupIsKilledWithIt) {
-  const TEST_RecordedSleeps sleeps;
+  const TEST_RecordedWaits waits;
   // setsid keeps the process id: the child leads the group that the sleeper is in.
   const std::string leader = directory.writeScript("leader", "sleep 1000 &\necho $!\necho $$\nwait\n");
   Process process(("/usr/bin/setsid " + leader).c_str());
@@ -141,7 +141,7 @@ TEST_F(ProcessWait, ChildThatLeadsAGroupIsKilledWithIt) {
 }
 
 TEST_F(ProcessWait, ChildThatEndsByItselfAtTheKillIsNeitherMissedNorASuccess) {
-  const TEST_RecordedSleeps sleeps;
+  const TEST_RecordedWaits waits;
   const KillRecord record;
   // Keeps the waiter from noticing the end of the child until the kill has been sent.
   std::optional<SystemFault> stalled(std::in_place, SystemCall::kWaitid, EINTR, 1, INT_MAX - 1);
@@ -161,7 +161,7 @@ TEST_F(ProcessWait, ChildThatEndsByItselfAtTheKillIsNeitherMissedNorASuccess) {
 }
 
 TEST_F(ProcessWait, ReapedChildIsNeverKilled) {
-  const TEST_RecordedSleeps sleeps;
+  const TEST_RecordedWaits waits;
   const KillRecord record;
   const ScopedVariable timeout("TIMEOUT", "0");
   Process process("/bin/true");
@@ -171,11 +171,11 @@ TEST_F(ProcessWait, ReapedChildIsNeverKilled) {
   EXPECT_TRUE(process.wait(&rc));
   EXPECT_EQ(rc, 0);
   EXPECT_TRUE(record.kills().empty());
-  EXPECT_TRUE(sleeps.waitedMilliseconds().empty());
+  EXPECT_TRUE(waits.milliseconds().empty());
 }
 
 TEST_F(ProcessWait, ChildThatCannotBeKilledDoesNotHoldTheCaller) {
-  const TEST_RecordedSleeps sleeps;
+  const TEST_RecordedWaits waits;
   const TEST_TraceCapture traces;
   pid_t pid = -1;
   {
