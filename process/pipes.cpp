@@ -13,6 +13,9 @@ namespace {
 
 RAS1_Unit traceUnit{"process/pipes"};
 
+/// Four times the usual: a child that prints much stops less often to be read.
+constexpr int kStdoutPipeBytes = 1 << 18;
+
 bool createPipe(Pipe& pipe) {
   int ends[2];
   if (pipe2(ends, O_CLOEXEC) != 0) return false;
@@ -47,6 +50,7 @@ bool createPipes(Pipe& stdinPipe, Pipe& stdoutPipe, Pipe& stderrPipe) {
     TRACE_ERRNO(trace, error);
     return false;
   }
+  (void)fcntl(stdoutPipe.readEnd.get(), F_SETPIPE_SZ, kStdoutPipeBytes);  // refused to those who have too many
   return true;
 }
 
