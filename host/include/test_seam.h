@@ -63,8 +63,8 @@ class TEST_RecordedWaits {
 /// "FSI1_NewList"; the result is the given status (a null result for those that return pointers, 0 for
 /// XML1_ParseBuffer). Those that can fail so: BSS1_GetEnv (its default), BSS1_PutEnv, BSS1_GetLock, BSS1_ReleaseLock,
 /// FSI1_*, XML1_ParserCreate, XML1_GetBuffer, XML1_ParseBuffer (XML1_GetErrorCode then gives the status),
-/// NLS2_GetLocale, RegisterWithManager, InsertRow, Dispatch. What gives something back (BSS1_ReleaseLock,
-/// FSI1_DeleteList) has done so, and so has Dispatch: the rows that waited are gone.
+/// NLS2_GetLocale, RegisterWithManager, InsertRow, Dispatch, rpc__register_mgr, rpc__malloc, rpc__alloc_pkt. What gives
+/// something back (BSS1_ReleaseLock, FSI1_DeleteList) has done so, and so has Dispatch: the rows that waited are gone.
 class TEST_FailCall {
  public:
   TEST_FailCall(const std::string& service, unsigned n, int status);
