@@ -41,7 +41,7 @@ struct RpcCall {
   uint32_t version = 1;
   uint32_t operation = 0;
   rpc__drep sender{};
-  std::string_view request;  ///< the body of the packet; not copied
+  std::string_view request{};  ///< the body of the packet; not copied
 };
 
 /// Makes the call on the calling thread; it may take long. An exception of a stub is the fault rpc__fault_unspecified,
