@@ -2,7 +2,7 @@
 # shellcheck shell=sh disable=SC2034  # the lists are for whoever sources this
 
 packages_build='g++ cmake ninja-build pkg-config libexpat1-dev libmicrohttpd-dev libcurl4-openssl-dev
-  nlohmann-json3-dev libcli11-dev'
+  nettle-dev nlohmann-json3-dev libcli11-dev'
 packages_run='curl ksh'
 packages_tests='libgtest-dev libgmock-dev libbenchmark-dev libyaml-cpp-dev'
 

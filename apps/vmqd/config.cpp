@@ -18,6 +18,7 @@ namespace {
 
 constexpr std::string_view environmentPrefix = "environment.";
 constexpr size_t largestFileBytes = 1 << 20;
+constexpr unsigned smallestPacket = 8192;  // holds at least one block of a file
 
 struct Key {
   std::string_view name;
@@ -59,6 +60,10 @@ constexpr Key keys[] = {
      "rows kept for a watcher that is slow to read (1000)"},
     {"maximum_request_bytes", "", [](auto& c, auto v) { c.maximum_request_bytes = number(v, 1024, 1 << 28); },
      "largest body of a request (1048576)"},
+    {"maximum_packet_bytes", "", [](auto& c, auto v) { c.maximum_packet_bytes = number(v, smallestPacket, 1 << 28); },
+     "largest packet of a remote call, such as a piece of a pushed file (4194304)"},
+    {"packet_memory_bytes", "", [](auto& c, auto v) { c.packet_memory_bytes = number(v, smallestPacket, 1u << 31); },
+     "packets of all clients together; calls beyond it are told to wait (33554432)"},
     {"maximum_connections", "", [](auto& c, auto v) { c.maximum_connections = number(v, 4, 10000); },
      "clients at a time; at most three quarters of them may watch (256)"},
     {"stop_seconds", "", [](auto& c, auto v) { c.stop_seconds = number(v, 0, 3600); },
@@ -114,6 +119,18 @@ void readLine(Configuration& configuration, const std::string& place, std::strin
   }
 }
 
+/// A packet for which there is never room could never be sent.
+void checkPacketMemory(const Configuration& configuration, const std::string& file) {
+  if (configuration.packet_memory_bytes >= configuration.maximum_packet_bytes) return;
+  const auto& places = configuration.places;
+  auto place = places.find("packet_memory_bytes");
+  if (place == places.end()) place = places.find("maximum_packet_bytes");
+  throw ConfigurationError((place == places.end() ? file : place->second) + ": packet_memory_bytes (" +
+                           std::to_string(configuration.packet_memory_bytes) +
+                           ") must not be less than maximum_packet_bytes (" +
+                           std::to_string(configuration.maximum_packet_bytes) + ")");
+}
+
 }  // namespace
 
 Configuration parseConfiguration(const std::string& file, std::string_view text) {
@@ -125,6 +142,7 @@ Configuration parseConfiguration(const std::string& file, std::string_view text)
     begin = end + 1;
   }
   if (configuration.home.empty()) throw ConfigurationError(file + ": home: is missing");
+  checkPacketMemory(configuration, file);
   return configuration;
 }
 

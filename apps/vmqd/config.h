@@ -22,6 +22,8 @@ struct Configuration {
   std::vector<uid_t> allowed_uids;  ///< beside root and the daemon's own
   unsigned event_buffer_rows = 1000;
   unsigned maximum_request_bytes = 1 << 20;
+  unsigned maximum_packet_bytes = 4 << 20;
+  unsigned packet_memory_bytes = 32 << 20;
   unsigned maximum_connections = 256;
   unsigned stop_seconds = 5;
 

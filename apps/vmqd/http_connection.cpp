@@ -82,34 +82,49 @@ HttpConnection::~HttpConnection() {
   server_.connections_.end();
 }
 
-MHD_Result HttpConnection::begin() {
+MHD_Result HttpConnection::begin(const char* method, const char* path) {
   body_.clear();
   body_bytes_ = 0;
+  no_room_ = false;
+  const bool is_packet = server_.carries_packet_(method, path);
+  maximum_bytes_ = is_packet ? server_.limits_.maximum_packet_bytes : server_.limits_.maximum_request_bytes;
   if (!admitted_) return refuseNow(errors::notAllowed, "The daemon does not admit your user.");
   if (one_too_many_) {
     return refuseNow(errors::busy,
                      "There are already " + std::to_string(server_.limits_.maximum_connections) + " connections.");
   }
-  const char* const length = MHD_lookup_connection_value(connection_, MHD_HEADER_KIND, MHD_HTTP_HEADER_CONTENT_LENGTH);
-  if (length == nullptr) return MHD_YES;
-  const std::string_view digits(length);
-  uint64_t bytes = UINT64_MAX;  // also what a number that is too large for 64 bits leaves
-  (void)std::from_chars(digits.data(), digits.data() + digits.size(), bytes);
-  return bytes > server_.limits_.maximum_request_bytes ? bodyTooLarge() : MHD_YES;
+  uint64_t bytes = maximum_bytes_;  // it may become as large when its length is not announced
+  if (const std::string_view digits = headerValue(MHD_HTTP_HEADER_CONTENT_LENGTH); !digits.empty()) {
+    bytes = UINT64_MAX;  // also what a number that is too large for 64 bits leaves
+    (void)std::from_chars(digits.data(), digits.data() + digits.size(), bytes);
+  }
+  if (bytes > maximum_bytes_) return bodyTooLarge();
+  if (is_packet) makeRoomForPacket(bytes);
+  return MHD_YES;
+}
+
+void HttpConnection::makeRoomForPacket(size_t bytes) {
+  share_ = server_.packet_memory_.take(bytes);
+  no_room_ = !share_;
+  if (share_) body_.reserve(bytes);  // at once, so that it is never copied
+}
+
+std::string_view HttpConnection::headerValue(const char* name) const {
+  const char* const value = MHD_lookup_connection_value(connection_, MHD_HEADER_KIND, name);
+  return value == nullptr ? std::string_view() : std::string_view(value);
 }
 
 MHD_Result HttpConnection::takeBody(const char* piece, size_t bytes) {
   body_bytes_ += bytes;
-  const size_t maximum = server_.limits_.maximum_request_bytes;
   // A body of unannounced length can be refused in words only once it has ended, but it need not end.
-  if (body_bytes_ > 16 * maximum) return MHD_NO;
-  if (body_bytes_ <= maximum) body_.append(piece, bytes);
+  if (body_bytes_ > 16 * maximum_bytes_) return MHD_NO;
+  if (body_bytes_ <= maximum_bytes_ && !no_room_) body_.append(piece, bytes);
   return MHD_YES;
 }
 
 MHD_Result HttpConnection::answer(const char* method, const char* path) {
-  if (body_bytes_ > server_.limits_.maximum_request_bytes) return bodyTooLarge();
-  Request request{method, path, {}, {}, body_, descriptor_};
+  if (body_bytes_ > maximum_bytes_) return bodyTooLarge();
+  Request request{method, path, {}, {}, body_, headerValue("Data-Representation"), descriptor_};
   (void)MHD_get_connection_values_n(connection_, MHD_GET_ARGUMENT_KIND, collectArgument, &request.arguments);
   server_.unfinished_.begin();
   unfinished_ = true;
@@ -118,20 +133,30 @@ MHD_Result HttpConnection::answer(const char* method, const char* path) {
     const Activity::Scope working(server_.working_);
     // A stop sets it before it looks at who is working, so no answer begins behind its back.
     if (server_.stopping_) return refuseNow(errors::busy, "The daemon is stopping.");
-    server_.answer_(request, reply);
+    if (no_room_) {
+      refuse(reply, errors::busy, "There is no room for the packet beside those that are being worked on.");
+    } else {
+      server_.answer_(request, reply);
+    }
   }
+  if (share_) giveRoomBack();
   return send(reply, false);
 }
 
+void HttpConnection::giveRoomBack() {
+  std::string().swap(body_);
+  share_.reset();
+}
+
 void HttpConnection::end() {
+  if (share_) giveRoomBack();
   trim(body_);
   trim(reply_);
   if (std::exchange(unfinished_, false)) server_.unfinished_.end();
 }
 
 MHD_Result HttpConnection::bodyTooLarge() {
-  return refuseNow(errors::bodyTooLarge,
-                   "The body is larger than " + std::to_string(server_.limits_.maximum_request_bytes) + " bytes.");
+  return refuseNow(errors::bodyTooLarge, "The body is larger than " + std::to_string(maximum_bytes_) + " bytes.");
 }
 
 /// The connection ends with the reply: a body that may still be coming is not read.
@@ -146,11 +171,13 @@ MHD_Result HttpConnection::send(Reply& reply, bool last) {
   const bool is_stream = reply.stream != nullptr;
   const Response response = newResponse(reply);
   if (!response ||
-      !addHeader(response, MHD_HTTP_HEADER_CONTENT_TYPE, is_stream ? "text/event-stream" : "application/json") ||
+      !addHeader(response, MHD_HTTP_HEADER_CONTENT_TYPE, is_stream ? "text/event-stream" : reply.content_type) ||
       (is_stream && !addHeader(response, MHD_HTTP_HEADER_CACHE_CONTROL, "no-cache")) ||
-      (!reply.allow.empty() && !addHeader(response, MHD_HTTP_HEADER_ALLOW, reply.allow.c_str())) ||
       (last && !addHeader(response, MHD_HTTP_HEADER_CONNECTION, "close"))) {
     return MHD_NO;
+  }
+  for (const auto& [name, value] : reply.headers) {
+    if (!addHeader(response, name, value.c_str())) return MHD_NO;
   }
   return MHD_queue_response(connection_, status, response.get());
 }

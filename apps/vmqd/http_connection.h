@@ -4,6 +4,7 @@
 #include <microhttpd.h>
 
 #include <cstddef>
+#include <optional>
 #include <string>
 
 #include "apps/vmqd/http_server.h"
@@ -21,7 +22,7 @@ class HttpConnection {
   HttpConnection& operator=(const HttpConnection&) = delete;
 
   // The steps of a request. The result is for the HTTP library: MHD_NO closes the connection.
-  MHD_Result begin();                                       ///< its header has arrived
+  MHD_Result begin(const char* method, const char* path);   ///< its header has arrived
   MHD_Result takeBody(const char* piece, size_t bytes);     ///< a piece of its body has
   MHD_Result answer(const char* method, const char* path);  ///< all of it has
   void end();                                               ///< its reply has been sent, or cannot be
@@ -29,6 +30,9 @@ class HttpConnection {
  private:
   MHD_Result refuseNow(const ErrorCode& code, const std::string& sentence);
   MHD_Result bodyTooLarge();
+  void makeRoomForPacket(size_t bytes);
+  void giveRoomBack();
+  [[nodiscard]] std::string_view headerValue(const char* name) const;
   MHD_Result send(Reply& reply, bool last);
 
   HttpServer& server_;
@@ -37,7 +41,10 @@ class HttpConnection {
   bool admitted_ = false;
   bool one_too_many_ = false;
   bool unfinished_ = false;
-  size_t body_bytes_ = 0;  // of those that came; body_ keeps no more than are allowed
+  size_t maximum_bytes_ = 0;                  // of this request's body
+  std::optional<PacketMemory::Share> share_;  // when the body is a packet and there was room for it
+  bool no_room_ = false;                      // when there was none: the body is read, but not kept
+  size_t body_bytes_ = 0;                     // of those that came; body_ keeps no more than are allowed
   std::string body_;
   std::string reply_;
 };

@@ -41,7 +41,7 @@ MHD_Result handleRequest(void*, MHD_Connection* connection, const char* path, co
   if (*request == nullptr) {
     HttpConnection* const begun = connectionOf(connection);
     *request = begun;
-    return begun == nullptr ? MHD_NO : begun->begin();
+    return begun == nullptr ? MHD_NO : begun->begin(method, path);
   }
   auto* const under_way = static_cast<HttpConnection*>(*request);
   if (*bytes == 0) return under_way->answer(method, path);
@@ -56,8 +56,9 @@ void requestEnded(void*, MHD_Connection*, void** request, MHD_RequestTermination
 
 }  // namespace
 
-HttpServer::HttpServer(ListeningSocket& socket, const AdmittedUsers& users, const HttpLimits& limits, Answer answer)
-    : socket_(socket), users_(users), limits_(limits), answer_(std::move(answer)) {
+HttpServer::HttpServer(ListeningSocket& socket, const AdmittedUsers& users, const HttpLimits& limits,
+                       CarriesPacket carriesPacket, Answer answer)
+    : socket_(socket), users_(users), limits_(limits), carries_packet_(carriesPacket), answer_(std::move(answer)) {
   constexpr unsigned flags =
       MHD_USE_THREAD_PER_CONNECTION | MHD_USE_INTERNAL_POLLING_THREAD | MHD_USE_POLL | MHD_USE_ITC;
   daemon_ = MHD_start_daemon(flags, 0, nullptr, nullptr, handleRequest, this,                            //

@@ -10,6 +10,7 @@
 
 #include "apps/vmqd/activity.h"
 #include "apps/vmqd/listening_socket.h"
+#include "apps/vmqd/packet_memory.h"
 #include "apps/vmqd/peer_credentials.h"
 #include "apps/vmqd/reply.h"
 
@@ -21,6 +22,8 @@ class HttpConnection;
 
 struct HttpLimits {
   unsigned maximum_request_bytes;
+  unsigned maximum_packet_bytes;
+  unsigned packet_memory_bytes;
   unsigned maximum_connections;
 };
 
@@ -28,9 +31,12 @@ class HttpServer {
  public:
   /// Answers a request; called on many threads at a time. Throws nothing but std::bad_alloc, which ends the connection.
   using Answer = std::function<void(Request&, Reply&)>;
+  /// Whether the body of a request to this path is a packet.
+  using CarriesPacket = bool (*)(std::string_view method, std::string_view path);
 
   /// Serves from now on. Throws std::runtime_error. `socket` outlives the server.
-  HttpServer(ListeningSocket& socket, const AdmittedUsers& users, const HttpLimits& limits, Answer answer);
+  HttpServer(ListeningSocket& socket, const AdmittedUsers& users, const HttpLimits& limits, CarriesPacket carriesPacket,
+             Answer answer);
   /// Without a stop() before, waits for every answer that is being worked out.
   ~HttpServer();
   HttpServer(const HttpServer&) = delete;
@@ -48,8 +54,10 @@ class HttpServer {
   ListeningSocket& socket_;
   const AdmittedUsers users_;
   const HttpLimits limits_;
+  const CarriesPacket carries_packet_;
   const Answer answer_;
   std::atomic<bool> stopping_{false};
+  PacketMemory packet_memory_{limits_.packet_memory_bytes};
   Activity connections_;
   Activity working_;     // in answer_
   Activity unfinished_;  // from answer_ until the reply has been sent

@@ -1,6 +1,7 @@
 // vmqd: the process that the component runs in.
 
 #include <limits.h>
+#include <malloc.h>
 #include <signal.h>
 #include <sys/eventfd.h>
 #include <sys/resource.h>
@@ -43,6 +44,13 @@ sigset_t blockSignals() {
     throw std::runtime_error(withReason("signals", error));
   }
   return ending;
+}
+
+/// Packets are large and come on many threads. Left to itself, the allocator would soon keep such blocks, for each
+/// thread its own.
+void giveLargeBlocksBack() {
+  constexpr int large = 256 * 1024;
+  (void)mallopt(M_MMAP_THRESHOLD, large);  // without it, more memory is kept
 }
 
 const char* waitForEnding(const sigset_t& ending) {
@@ -90,6 +98,7 @@ void tell(const ServiceManager& manager, const char* state) {
 }
 
 int run(const Configuration& configuration) {
+  giveLargeBlocksBack();
   const sigset_t ending = blockSignals();
   const ServiceManager manager;
   ListeningSocket socket(configuration.socket, guestsOf(configuration));
@@ -100,6 +109,7 @@ int run(const Configuration& configuration) {
   settings.node = configuration.node.empty() ? hostName() : configuration.node;
   settings.event_buffer_rows = configuration.event_buffer_rows;
   settings.maximum_watchers = configuration.maximum_connections / 4 * 3;
+  settings.maximum_packet_bytes = configuration.maximum_packet_bytes;
   settings.stop = stop.get();
 
   applyEnvironment(configuration);
@@ -112,8 +122,9 @@ int run(const Configuration& configuration) {
   warn(service);
   warnOfTooFewDescriptors(configuration.maximum_connections);
   HttpServer server(socket, AdmittedUsers(configuration.allowed_uids),
-                    {configuration.maximum_request_bytes, configuration.maximum_connections},
-                    [&service](Request& request, Reply& reply) { answer(service, request, reply); });
+                    {configuration.maximum_request_bytes, configuration.maximum_packet_bytes,
+                     configuration.packet_memory_bytes, configuration.maximum_connections},
+                    carriesPacket, [&service](Request& request, Reply& reply) { answer(service, request, reply); });
   logLine("version " VMQ_VERSION " listening on " + socket.path());
   tell(manager, "READY=1");
 

@@ -5,6 +5,11 @@
 #include "apps/vmqd/json_text.h"
 
 namespace vmqd {
+namespace {
+
+constexpr const char* retrySeconds = "1";
+
+}  // namespace
 
 std::string inQuotes(std::string_view text) {
   constexpr size_t longest = 100;
@@ -13,13 +18,20 @@ std::string inQuotes(std::string_view text) {
   return result.append(text.substr(0, longest)) + "...\"";
 }
 
-void refuse(Reply& reply, const ErrorCode& code, std::string_view sentence) {
+void refuse(Reply& reply, const ErrorCode& code, std::string_view sentence, std::optional<uint32_t> status) {
   reply.status = code.status;
+  reply.content_type = jsonType;
+  reply.headers.clear();
   reply.stream.reset();
+  if (code.name == errors::busy.name) reply.headers.emplace_back("Retry-After", retrySeconds);
   reply.text = R"({"error":{"code":)";
   appendJsonString(reply.text, code.name);
   reply.text += R"(,"message":)";
   appendJsonString(reply.text, sentence);
+  if (status) {
+    reply.text += R"(,"status":)";
+    appendJsonNumber(reply.text, *status);
+  }
   reply.text += "}}";
 }
 

@@ -1,10 +1,12 @@
 #pragma once
 // What a route is asked and what it answers, whatever carries it.
 
+#include <array>
 #include <cstddef>
 #include <memory>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 namespace vmqd {
@@ -18,10 +20,11 @@ struct Argument {
 struct Request {
   std::string_view method;
   std::string_view path;
-  std::string_view parameter;       ///< what stands in the path where the route has a "{...}"
-  std::vector<Argument> arguments;  ///< of the query string, decoded, in the order sent
+  std::array<std::string_view, 2> parameters;  ///< what stands in the path where the route has its "{...}"s
+  std::vector<Argument> arguments;             ///< of the query string, decoded, in the order sent
   std::string_view body;
-  int client = -1;  ///< descriptor of the connection
+  std::string_view representation;  ///< the header Data-Representation; empty when there is none
+  int client = -1;                  ///< descriptor of the connection
 };
 
 /// A reply without a known end.
@@ -32,12 +35,15 @@ class ReplyStream {
   virtual size_t read(char* buffer, size_t capacity) = 0;
 };
 
+inline constexpr const char* jsonType = "application/json";
+
 struct Reply {
   explicit Reply(std::string& reused) : text(reused) { text.clear(); }
 
   unsigned status = 200;
-  std::string& text;                    ///< JSON; in a buffer that the connection keeps
-  std::string allow;                    ///< methods, for 405
+  std::string& text;  ///< in a buffer that the connection keeps
+  const char* content_type = jsonType;
+  std::vector<std::pair<const char*, std::string>> headers;  ///< beside the usual ones
   std::unique_ptr<ReplyStream> stream;  ///< if there is one, the text/event-stream that is sent instead of `text`
 };
 

@@ -2,10 +2,12 @@
 
 #include "apps/vmqd/routes.h"
 
+#include <array>
 #include <exception>
-#include <optional>
 
+#include "apps/vmqd/depot_routes.h"
 #include "apps/vmqd/refusal.h"
+#include "apps/vmqd/rpc_routes.h"
 #include "apps/vmqd/service_routes.h"
 #include "apps/vmqd/table_routes.h"
 
@@ -13,41 +15,58 @@ namespace vmqd {
 namespace {
 
 constexpr Route table[] = {
-    {"GET", "/v1", answerService},
-    {"GET", "/v1/health", answerHealth},
-    {"GET", "/v1/tables", answerTables},
-    {"POST", "/v1/tables/{table}/query", answerQuery},
-    {"GET", "/v1/tables/{table}/events", answerEvents},
+    {"GET", "/v1", answerService, Body::kText},
+    {"GET", "/v1/health", answerHealth, Body::kText},
+    {"GET", "/v1/tables", answerTables, Body::kText},
+    {"POST", "/v1/tables/{table}/query", answerQuery, Body::kText},
+    {"GET", "/v1/tables/{table}/events", answerEvents, Body::kText},
+    {"POST", "/v1/rpc/{interface}/{operation}", answerCall, Body::kPacket},
+    {"GET", "/v1/depot/{path}", answerDepotFile, Body::kText},
 };
 
-/// What stands where the pattern has its parameter ("" when it has none); nothing when the path does not match.
-std::optional<std::string_view> match(std::string_view pattern, std::string_view path) {
-  const size_t open = pattern.find('{');
-  if (open == std::string_view::npos) {
-    return pattern == path ? std::optional<std::string_view>("") : std::nullopt;
+constexpr std::string_view restParameter = "{path}";
+
+/// Takes the text up to the first "/", which stays.
+std::string_view takeSegment(std::string_view& text) {
+  const std::string_view segment = text.substr(0, text.find('/'));
+  text.remove_prefix(segment.size());
+  return segment;
+}
+
+/// True when the path matches the pattern; then its parameters are set.
+bool match(std::string_view pattern, std::string_view path, std::array<std::string_view, 2>& parameters) {
+  size_t parameter = 0;
+  while (!pattern.empty() && !path.empty()) {
+    if (pattern.front() != '/' || path.front() != '/') return false;
+    pattern.remove_prefix(1);
+    path.remove_prefix(1);
+    const std::string_view expected = takeSegment(pattern);
+    if (expected == restParameter) {
+      parameters[parameter] = path;
+      return true;
+    }
+    const std::string_view segment = takeSegment(path);
+    if (expected.substr(0, 1) == "{") {
+      if (segment.empty()) return false;
+      parameters[parameter++] = segment;
+    } else if (segment != expected) {
+      return false;
+    }
   }
-  const std::string_view before = pattern.substr(0, open);
-  const std::string_view after = pattern.substr(pattern.find('}') + 1);
-  if (path.size() <= before.size() + after.size()) return std::nullopt;
-  if (path.substr(0, before.size()) != before || path.substr(path.size() - after.size()) != after) return std::nullopt;
-  const std::string_view parameter = path.substr(before.size(), path.size() - before.size() - after.size());
-  if (parameter.find('/') != std::string_view::npos) return std::nullopt;
-  return parameter;
+  return pattern.empty() && path.empty();
 }
 
 void dispatch(Service& service, Request& request, Reply& reply) {
+  std::string allowed;
   for (const Route& route : table) {
-    const auto parameter = match(route.path, request.path);
-    if (!parameter) continue;
-    if (route.method == request.method) {
-      request.parameter = *parameter;
-      return route.answer(service, request, reply);
-    }
-    if (!reply.allow.empty()) reply.allow += ", ";
-    reply.allow += route.method;
+    if (!match(route.path, request.path, request.parameters)) continue;
+    if (route.method == request.method) return route.answer(service, request, reply);
+    if (!allowed.empty()) allowed += ", ";
+    allowed += route.method;
   }
-  if (reply.allow.empty()) throw Refusal(errors::unknownRoute, "There is nothing at " + inQuotes(request.path) + ".");
-  throw Refusal(errors::methodNotAllowed, inQuotes(request.path) + " only knows the method " + reply.allow + ".");
+  if (allowed.empty()) throw Refusal(errors::unknownRoute, "There is nothing at " + inQuotes(request.path) + ".");
+  refuse(reply, errors::methodNotAllowed, inQuotes(request.path) + " only knows the method " + allowed + ".");
+  reply.headers.emplace_back("Allow", allowed);
 }
 
 }  // namespace
@@ -56,11 +75,19 @@ std::span<const Route> routes() {
   return table;
 }
 
+bool carriesPacket(std::string_view method, std::string_view path) {
+  std::array<std::string_view, 2> ignored;
+  for (const Route& route : table) {
+    if (route.method == method && match(route.path, path, ignored)) return route.body == Body::kPacket;
+  }
+  return false;
+}
+
 void answer(Service& service, Request& request, Reply& reply) {
   try {
     dispatch(service, request, reply);
   } catch (const Refusal& refusal) {
-    refuse(reply, refusal.code(), refusal.what());
+    refuse(reply, refusal.code(), refusal.what(), refusal.status());
   } catch (const std::exception& error) {
     refuse(reply, errors::internal, std::string("The daemon failed: ") + error.what() + ".");
   }

@@ -15,6 +15,7 @@ struct ServiceSettings {
   std::string depot;  ///< empty when none is set
   unsigned event_buffer_rows = 0;
   unsigned maximum_watchers = 0;
+  unsigned maximum_packet_bytes = 0;
   std::chrono::milliseconds keep_alive = std::chrono::seconds(15);
   int stop = -1;  ///< descriptor that becomes readable when every watch is to end
 };

@@ -13,6 +13,8 @@ void answerService(Service& service, const Request&, Reply& reply) {
   appendJsonString(reply.text, service.settings.home);
   reply.text += R"(,"depot":)";
   appendJsonString(reply.text, service.settings.depot);
+  reply.text += R"(,"maximum_packet_bytes":)";
+  appendJsonNumber(reply.text, service.settings.maximum_packet_bytes);
   reply.text += '}';
 }
 

@@ -12,8 +12,8 @@ namespace vmqd {
 namespace {
 
 const Table& tableOf(const Service& service, const Request& request) {
-  if (const Table* const table = service.tables.find(request.parameter)) return *table;
-  throw Refusal(errors::unknownTable, "There is no table " + inQuotes(request.parameter) + ".");
+  if (const Table* const table = service.tables.find(request.parameters[0])) return *table;
+  throw Refusal(errors::unknownTable, "There is no table " + inQuotes(request.parameters[0]) + ".");
 }
 
 /// Writes rows into the reply as they come. They may come on another thread, if the table has an event meanwhile, but

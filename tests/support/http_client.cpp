@@ -102,7 +102,7 @@ bool HttpClient::takeChunk(std::string* out) {
   return size > 0;
 }
 
-HttpReply HttpClient::receiveHeader() {
+HttpReply HttpClient::takeHeader() {
   HttpReply reply;
   const std::string status = takeLine();
   if (status.compare(0, 9, "HTTP/1.1 ") != 0) throw std::runtime_error("no HTTP: " + status);
@@ -112,7 +112,16 @@ HttpReply HttpClient::receiveHeader() {
     if (colon == std::string::npos) throw std::runtime_error("no header: " + line);
     reply.headers[lowerCase(line.substr(0, colon))] = line.substr(colon + 2);
   }
+  return reply;
+}
+
+HttpReply HttpClient::receiveHeader() {
+  HttpReply reply = takeHeader();
   return reply.status == 100 ? receiveHeader() : reply;
+}
+
+int HttpClient::receiveInterim() {
+  return takeHeader().status;
 }
 
 HttpReply HttpClient::receive() {

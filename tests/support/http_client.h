@@ -33,6 +33,8 @@ class HttpClient {
   HttpReply receive();
   /// Reads the header of a reply; what follows is for nextEvent().
   HttpReply receiveHeader();
+  /// Reads the header of a reply, or of an interim one (100), and gives its status.
+  int receiveInterim();
 
   struct Event {
     std::string name;  ///< empty for a comment
@@ -53,6 +55,7 @@ class HttpClient {
  private:
   bool fill();
   std::string takeLine();
+  HttpReply takeHeader();
   std::string takeBytes(size_t count);
   bool takeChunk(std::string* out);
 

@@ -6,6 +6,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <filesystem>
 #include <functional>
 #include <map>
 #include <memory>
@@ -33,6 +34,11 @@ std::string upperCase(std::string text) {
   return text;
 }
 
+std::string lowerCase(std::string text) {
+  for (char& c : text) c = static_cast<char>(std::tolower(c));
+  return text;
+}
+
 /// "METHOD path" of every operation described.
 std::set<std::string> describedOperations() {
   std::set<std::string> operations;
@@ -52,19 +58,21 @@ TEST(ApiDescriptionFile, HasTheRoutesOfTheDaemonAndNoOthers) {
   EXPECT_EQ(known, describedOperations());
 }
 
-/// Brings one status about on one path, which names its parameter {table}.
+/// Brings one status about on one path, whose parameters have the names of the description.
 class Provocation {
  public:
   HttpReply reply(int status, const std::string& method, const std::string& path) {
     switch (status) {
       case 200:
-        return ask(daemon_, method, on(path, isQuery(path) ? "ECHO" : "EVENTS"), isQuery(path) ? queryBody : "");
+        return good(method, path);
       case 400:
         return bad(method, path);
       case 403:
         return asAnotherUser(method, on(path, "ECHO"));
       case 404:
         return ask(daemon_, method, on(path, "NONE"), "{}");
+      case 422:
+        return ask(daemon_, method, on(path, /*operation=*/"1"), "469762055");
       case 405:
         return ask(daemon_, "DELETE", on(path, "ECHO"), "");
       case 413:
@@ -82,14 +90,28 @@ class Provocation {
   static constexpr const char* queryBody = R"({"predicates":{"COUNT":2}})";
 
   static bool isQuery(const std::string& path) { return path.find("/query") != std::string::npos; }
-  static std::string on(std::string path, const std::string& table) {
-    const size_t parameter = path.find("{table}");
-    if (parameter != std::string::npos) path.replace(parameter, 7, table);
+  static bool isCall(const std::string& path) { return path.find("/rpc/") != std::string::npos; }
+  static bool isDepot(const std::string& path) { return path.find("/depot/") != std::string::npos; }
+  /// The path with the value in place of its last parameter.
+  static std::string on(std::string path, const std::string& value) {
+    const size_t interface = path.find("{interface}");
+    if (interface != std::string::npos) path.replace(interface, 11, "5a000000-0000-0000-0000-000000000001");
+    const size_t parameter = path.find('{');
+    if (parameter != std::string::npos) path.replace(parameter, path.find('}') + 1 - parameter, value);
     return path;
+  }
+  HttpReply good(const std::string& method, const std::string& path) const {
+    if (isQuery(path)) return ask(daemon_, method, on(path, "ECHO"), queryBody);
+    if (isCall(path)) return ask(daemon_, method, on(path, "0"), "text");
+    if (isDepot(path)) daemon_.directory().writeFile("depot/a/file", "text");
+    return ask(daemon_, method, on(path, isDepot(path) ? "a/file" : "EVENTS"), "");
   }
   /// Streams are read up to their first event.
   static HttpReply ask(HttpClient& client, const std::string& method, const std::string& path,
                        const std::string& body) {
+    if (isCall(path)) {
+      return client.request(method, path + "?version=3", body, "Data-Representation: 10000000\r\n");
+    }
     if (path.find("/events") == std::string::npos || method != "GET") return client.request(method, path, body);
     HttpReply reply = client.watch(path);
     if (reply.status == 200) reply.body = client.nextEvent()->data;
@@ -102,10 +124,16 @@ class Provocation {
   }
   HttpReply bad(const std::string& method, const std::string& path) const {
     if (isQuery(path)) return ask(daemon_, method, on(path, "ECHO"), "[]");
+    if (isCall(path)) return HttpClient(daemon_.socket()).request(method, on(path, "0"), "without a label");
+    if (isDepot(path)) return ask(daemon_, method, on(path, "../file"), "");
     return ask(daemon_, method, on(path, "ECHO") + "?NONE=1", "");
   }
   HttpReply failing(const std::string& method, const std::string& path) const {
     if (isQuery(path)) return ask(daemon_, method, on(path, "FAILS"), R"({"predicates":{"TEXT":"create"}})");
+    if (isDepot(path)) {
+      std::filesystem::create_symlink("/proc/self/mem", daemon_.depot() + "/unreadable");
+      return ask(daemon_, method, on(path, "unreadable"), "");
+    }
     return ask(daemon_, method, on(path, "FAILS") + "?TEXT=create", "");
   }
   HttpReply tooLarge(const std::string& method, const std::string& path) const {
@@ -156,9 +184,13 @@ TEST(ApiDescriptionFile, TellsTheStatusAndShapeOfEachReply) {
         ASSERT_TRUE(described["content"][type]) << type;
         const YAML::Node schema = status == 200 && type == "text/event-stream" ? description().schema("Opened")
                                                                                : described["content"][type]["schema"];
-        EXPECT_EQ("", description().mismatch(json::parse(reply.body), schema)) << reply.body;
+        if (type == "application/octet-stream") {
+          EXPECT_EQ("binary", schema["format"].as<std::string>());
+        } else {
+          EXPECT_EQ("", description().mismatch(json::parse(reply.body), schema)) << reply.body;
+        }
         for (const auto& header : described["headers"]) {
-          EXPECT_EQ(1u, reply.headers.count(header.first.as<std::string>() == "Allow" ? "allow" : "?"));
+          EXPECT_EQ(1u, reply.headers.count(lowerCase(header.first.as<std::string>())));
         }
       }
     }
@@ -226,7 +258,7 @@ TEST(ApiDescriptionFile, KnowsEveryErrorCode) {
   using namespace vmqd::errors;
   std::set<std::string> codes;
   for (const vmqd::ErrorCode& code : {badJson, badRequest, unknownColumn, unknownOperator, notAllowed, unknownTable,
-                                      unknownRoute, methodNotAllowed, bodyTooLarge, internal, busy}) {
+                                      unknownRoute, notFound, methodNotAllowed, bodyTooLarge, fault, internal, busy}) {
     codes.insert(std::string(code.name));
   }
   EXPECT_EQ(codes, described);

@@ -38,6 +38,8 @@ TEST(Configuration, OnlyTheHomeIsRequired) {
   EXPECT_EQ("", configuration.node);
   EXPECT_EQ(1000u, configuration.event_buffer_rows);
   EXPECT_EQ(1048576u, configuration.maximum_request_bytes);
+  EXPECT_EQ(4194304u, configuration.maximum_packet_bytes);
+  EXPECT_EQ(33554432u, configuration.packet_memory_bytes);
   EXPECT_EQ(256u, configuration.maximum_connections);
   EXPECT_EQ(5u, configuration.stop_seconds);
   EXPECT_THAT(configuration.allowed_uids, ElementsAre());
@@ -56,6 +58,8 @@ TEST(Configuration, EveryKeyHasItsPlace) {
       "allowed_uids = 1000, 1001\n"
       "event_buffer_rows = 1\n"
       "maximum_request_bytes = 1024\n"
+      "maximum_packet_bytes = 8192\n"
+      "packet_memory_bytes = 2147483648\n"
       "maximum_connections = 4\n"
       "stop_seconds = 0\n"
       "environment.JAVA_HOME = /usr/lib/jvm = x\n"
@@ -66,6 +70,8 @@ TEST(Configuration, EveryKeyHasItsPlace) {
   EXPECT_THAT(configuration.allowed_uids, ElementsAre(1000u, 1001u));
   EXPECT_EQ(1u, configuration.event_buffer_rows);
   EXPECT_EQ(1024u, configuration.maximum_request_bytes);
+  EXPECT_EQ(8192u, configuration.maximum_packet_bytes);
+  EXPECT_EQ(2147483648u, configuration.packet_memory_bytes);
   EXPECT_EQ(4u, configuration.maximum_connections);
   EXPECT_EQ(0u, configuration.stop_seconds);
   EXPECT_THAT(configuration.variables,
@@ -135,6 +141,15 @@ const Mistake mistakes[] = {
             "vmqd.conf:2: event_buffer_rows: must be a number from 1 to 1000000"},
     Mistake{"maximum_request_bytes = 1023",
             "vmqd.conf:2: maximum_request_bytes: must be a number from 1024 to 268435456"},
+    Mistake{"maximum_packet_bytes = 8191",
+            "vmqd.conf:2: maximum_packet_bytes: must be a number from 8192 to 268435456"},
+    Mistake{"packet_memory_bytes = 8191", "vmqd.conf:2: packet_memory_bytes: must be a number from 8192 to 2147483648"},
+    Mistake{"packet_memory_bytes = 4194303",
+            "vmqd.conf:2: packet_memory_bytes: packet_memory_bytes (4194303) must not be less than "
+            "maximum_packet_bytes (4194304)"},
+    Mistake{"maximum_packet_bytes = 33554433",
+            "vmqd.conf:2: maximum_packet_bytes: packet_memory_bytes (33554432) must not be less than "
+            "maximum_packet_bytes (33554433)"},
     Mistake{"maximum_connections = 3", "vmqd.conf:2: maximum_connections: must be a number from 4 to 10000"},
     Mistake{"stop_seconds = 3601", "vmqd.conf:2: stop_seconds: must be a number from 0 to 3600"},
     Mistake{"environment. = x", "vmqd.conf:2: environment.: is not the name of an environment variable"},

@@ -18,8 +18,11 @@ TEST(ServiceRoute, TellsWhatRunsWhere) {
   const HttpReply reply = HttpClient(daemon.socket()).get("/v1");
   EXPECT_EQ(200, reply.status);
   EXPECT_EQ("application/json", reply.headers.at("content-type"));
-  const json expected = {
-      {"version", VMQ_VERSION}, {"node", "testnode"}, {"home", daemon.home()}, {"depot", daemon.depot()}};
+  const json expected = {{"version", VMQ_VERSION},
+                         {"node", "testnode"},
+                         {"home", daemon.home()},
+                         {"depot", daemon.depot()},
+                         {"maximum_packet_bytes", 4194304}};
   EXPECT_EQ(expected, json::parse(reply.body));
 }
 

@@ -6,6 +6,11 @@
 //   EVENTS a query sends COUNT events, numbered by NUMBER, with its TEXT; whatever is open on the table gets those that
 //          pass its predicates, and so the query answers with them too
 //   FAILS  TEXT=create: no request can be opened; TEXT=sample: the sampling throws
+// And the interface 5a000000-0000-0000-0000-000000000001, version 3, with the operations
+//   0 replies with the sender's label, a blank and the request
+//   1 raises the fault whose decimal number the request is
+//   2 throws
+//   3 opens the FIFO named by the request for reading, waits for its end and replies "passed"
 // The environment variable TEST_STATUS is what the entry point returns.
 
 #include <fcntl.h>
@@ -20,6 +25,7 @@
 #include "bss1.h"
 #include "bxira.h"
 #include "linked_list.h"
+#include "rpc.h"
 #include "table_manager.h"
 
 namespace {
@@ -133,13 +139,17 @@ void echo(TestRequest& request) {
   for (row.number = 0; row.number < count; ++row.number) request.insertMatching(row);
 }
 
-void passGate(TestRequest& request) {
-  const int fifo = open(request.predicate("BYTES").c_str(), O_RDONLY | O_CLOEXEC);
+void waitAtGate(const std::string& path) {
+  const int fifo = open(path.c_str(), O_RDONLY | O_CLOEXEC);
   if (fifo < 0) throw std::runtime_error("no such gate");
   char ignored;
   while (read(fifo, &ignored, 1) > 0) {
   }
   close(fifo);
+}
+
+void passGate(TestRequest& request) {
+  waitAtGate(request.predicate("BYTES"));
   Row row{};
   pad(row.text, sizeof row.text, "passed");
   request.insert(row);
@@ -169,6 +179,48 @@ void fail(TestRequest& request) {
   if (request.predicate("TEXT") == "sample") throw std::runtime_error("told to fail");
 }
 
+// ---- the interface
+// ---------------------------------------------------------------------------------------------------
+
+std::string bodyOf(const rpc__call& call) {
+  return {reinterpret_cast<const char*>(call.request->body), call.request->body_bytes};
+}
+
+rpc__reply replyWith(const std::string& text) {
+  rpc__packet* const packet = rpc__alloc_pkt(static_cast<uint32_t>(text.size()));
+  std::memcpy(packet->body, text.data(), text.size());
+  return {packet, static_cast<uint32_t>(text.size())};
+}
+
+rpc__reply echoCall(const rpc__call& call) {
+  return replyWith(std::string(call.sender.integers == rpc__little_endian ? "little" : "big") +
+                   (call.sender.characters == rpc__ascii ? " ascii " : " ebcdic ") + bodyOf(call));
+}
+rpc__reply raiseFault(const rpc__call& call) {
+  PFM1__Raise(static_cast<uint32_t>(std::stoul(bodyOf(call))));
+}
+rpc__reply failCall(const rpc__call&) {
+  throw std::runtime_error("told to fail");
+}
+rpc__reply waitInCall(const rpc__call& call) {
+  const std::string path = bodyOf(call);
+  waitAtGate(path.substr(0, path.find('\0')));
+  return replyWith("passed");
+}
+
+rpc__server_epv testEpv() {
+  static constexpr rpc__server_stub stubs[] = {echoCall, raiseFault, failCall, waitInCall};
+  return {stubs, sizeof stubs / sizeof *stubs};
+}
+
+constexpr rpc__if_spec testInterface{"test", {{0x5a, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 1}}, 3, testEpv};
+constexpr int noManager = 0;
+
+void registerInterface() {
+  uint32_t status;
+  rpc__register_mgr(&rpc__nil_type, &testInterface, &noManager, &status);
+}
+
 }  // namespace
 
 extern "C" [[gnu::visibility("default")]] unsigned Initialize_Mgmt_Functions() {
@@ -176,5 +228,6 @@ extern "C" [[gnu::visibility("default")]] unsigned Initialize_Mgmt_Functions() {
   (void)TableManager::RegisterWithManager(new TestManager("GATE", passGate));
   (void)TableManager::RegisterWithManager(new TestManager("EVENTS", sendEvents));
   (void)TableManager::RegisterWithManager(new TestManager("FAILS", fail));
+  registerInterface();
   return static_cast<unsigned>(std::atoi(BSS1_GetEnv("TEST_STATUS", "0")));
 }

@@ -32,7 +32,14 @@ inline std::string errorCode(const HttpReply& reply) {
   return json["error"]["code"].get<std::string>();
 }
 
-/// A FIFO on which a query of the table GATE blocks.
+/// Calls an operation of the interface of test_component.cpp, as a little-endian client.
+inline HttpReply callOperation(HttpClient& client, int operation, const std::string& packet) {
+  return client.request("POST",
+                        "/v1/rpc/5a000000-0000-0000-0000-000000000001/" + std::to_string(operation) + "?version=3",
+                        packet, "Data-Representation: 10000000\r\n");
+}
+
+/// A FIFO on which a query of the table GATE, or a call of operation 3, blocks.
 class Gate {
  public:
   explicit Gate(const std::string& path);
@@ -40,6 +47,8 @@ class Gate {
   Gate(const Gate&) = delete;
   Gate& operator=(const Gate&) = delete;
 
+  /// The body of a call of operation 3, `bytes` long.
+  [[nodiscard]] std::string packet(size_t bytes) const { return path_ + std::string(bytes - path_.size(), '\0'); }
   /// The body of the query.
   [[nodiscard]] std::string query() const { return "{\"predicates\":{\"BYTES\":\"" + path_ + "\"}}"; }
   /// Waits until a query blocks on it.
