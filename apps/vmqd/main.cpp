@@ -11,8 +11,10 @@
 #include <cerrno>
 #include <cstring>
 #include <exception>
+#include <filesystem>
 #include <stdexcept>
 #include <string>
+#include <system_error>
 #include <vector>
 
 #include "apps/vmqd/command_line.h"
@@ -85,10 +87,15 @@ void warnOfTooFewDescriptors(unsigned maximum_connections) {
 }
 
 void warn(const Service& service) {
-  const std::string& depot = service.settings.depot;
-  if (!depot.empty() && onDifferentFileSystems(depot, service.settings.home)) {
+  const std::string& depot = service.settings.depot.empty() ? service.settings.home : service.settings.depot;
+  const std::string work = service.settings.home + "/tmp";  // where line ends of pushed files are converted
+  if (onDifferentFileSystems(depot, work)) {
     logWarning("the depot " + depot + " and the home " + service.settings.home +
                " are on different file systems: files that are pushed with a conversion of line ends will fail");
+  }
+  std::error_code ignored;  // what cannot be looked at is no directory
+  if (!std::filesystem::is_directory(work, ignored)) {
+    logWarning("the home has no directory " + work + ": line ends of files that are pushed will not be converted");
   }
   if (service.tables.empty()) logWarning("the component has registered no tables");
 }

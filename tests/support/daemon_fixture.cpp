@@ -7,7 +7,7 @@
 #include <stdexcept>
 
 DaemonFixture::DaemonFixture(Options options) : home_(options.home.empty() ? directory_ / "home" : options.home) {
-  std::filesystem::create_directories(home_);
+  if (options.home.empty()) std::filesystem::create_directories(home_ + "/tmp");
   std::filesystem::create_directories(depot());
   std::string text = "socket = " + socket() + "\nhome = " + home_ + "\ndepot = " + depot() + "\nnode = " + node + "\n";
   if (!options.library.empty()) text += "library = " + options.library + "\n";

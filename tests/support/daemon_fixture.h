@@ -11,7 +11,7 @@
 class DaemonFixture {
  public:
   struct Options {
-    std::string home;                ///< an existing installation home; empty: an empty one in the scratch directory
+    std::string home;                ///< an existing installation home; empty: one in the scratch directory with nothing but "tmp"
     std::string library;             ///< the component; empty: the project's own
     std::vector<std::string> lines;  ///< further lines of the configuration file
     bool start = true;

@@ -329,6 +329,22 @@ TEST(Start, WarnsWhenDepotAndHomeAreOnDifferentFileSystems) {
                                       daemon.home() + " are on different file systems"));
 }
 
+TEST(Start, WarnsWhenTheDirectoryOfTheWorkFileIsOnAnotherFileSystem) {
+  TestDaemon daemon({}, /*start=*/false);
+  fs::remove(daemon.home() + "/tmp");
+  fs::create_symlink("/proc", daemon.home() + "/tmp");
+  daemon.start();
+  EXPECT_THAT(daemon.log(), HasSubstr(" are on different file systems"));
+}
+
+TEST(Start, WarnsWhenTheHomeHasNoDirectoryForTheWorkFile) {
+  TestDaemon daemon({}, /*start=*/false);
+  fs::remove(daemon.home() + "/tmp");
+  daemon.start();
+  EXPECT_THAT(daemon.log(), HasSubstr("vmqd: warning: the home has no directory " + daemon.home() +
+                                      "/tmp: line ends of files that are pushed will not be converted\n"));
+}
+
 TEST(Start, WarnsWhenConnectionsMayRunOutOfDescriptors) {
   rlimit before{};
   ASSERT_EQ(0, getrlimit(RLIMIT_NOFILE, &before));

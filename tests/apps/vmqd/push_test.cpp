@@ -63,7 +63,6 @@ TEST(Push, StoresAFileInChunks) {
 
 TEST(Push, ConvertsScripts) {
   const DaemonFixture daemon;
-  daemon.directory().writeFile("home/tmp/made", "");
   HttpClient client(daemon.socket());
   EXPECT_EQ(0u, push(client, "install.sh", 1, "#!/bin/sh\r\nexit\r\n\x1A"));
   EXPECT_EQ("#!/bin/sh\nexit\n", readWholeFile(daemon.depot() + "/install.sh"));
