@@ -38,6 +38,7 @@ TransferTest::TransferTest() {
   std::filesystem::create_directories(home_ + "/tmp");
   std::filesystem::create_directories(depot_);
   VMQ::Util::TEST_forgetDirectories();
+  (void)VMQ::String("first").c_str();  // chooses the conversions' locale while there is one thread only
 }
 
 TransferTest::~TransferTest() {
