@@ -86,7 +86,7 @@ File open(const Trace& trace, const String& path, int32_t chunkNumber) {
 Status write(const Trace& trace, const String& path, File file, const DataBlock* blocks, int32_t lastBlockIndex) {
   for (int32_t index = 0; index <= lastBlockIndex; ++index) {
     const DataBlock& block = blocks[index];
-    if (block.length < 0 || static_cast<uint32_t>(block.length) > sizeof block.data) {
+    if (static_cast<uint32_t>(block.length) > sizeof block.data) {  // negative ones too
       TRACE_ERROR(trace, "Block %d has an impossible length of %d bytes", index, block.length);
       return notWritten;
     }

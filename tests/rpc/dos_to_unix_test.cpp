@@ -126,6 +126,21 @@ TEST_F(ConvertDos2UnixTest, LinkInPlaceOfTheWorkFileIsNotFollowed) {
   EXPECT_FALSE(fs::exists(directory_ / "nowhere"));
 }
 
+TEST_F(ConvertDos2UnixTest, OldWorkFileThatCannotBeRemovedIsNotWrittenToEither) {
+  const std::string path = newScript();
+  const std::string kept = directory_.writeFile("kept", "precious");
+  for (const bool symbolic : {false, true}) {
+    fs::remove(work_file_);
+    symbolic ? fs::create_symlink(kept, work_file_) : fs::create_hard_link(kept, work_file_);
+    trace_.clear();
+    const FailingFile failing(FileCall::kUnlink, EPERM);
+    EXPECT_EQ(convertDOS2Unix(path.c_str()), -1);
+    EXPECT_THAT(trace_.texts(RAS1_ERROR), ElementsAre("Could not open [" + work_file_ + "] for writing."));
+    EXPECT_EQ(readWholeFile(kept), "precious");
+    EXPECT_EQ(readWholeFile(path), "line\r\n");
+  }
+}
+
 TEST_F(ConvertDos2UnixTest, WhatCannotBeRemovedIsInTheWay) {
   const std::string path = newScript();
   fs::create_directory(work_file_);
