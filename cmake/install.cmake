@@ -5,7 +5,7 @@ set_target_properties(vmq PROPERTIES INSTALL_RPATH "$ORIGIN")
 
 install(TARGETS vmqd vmqctl RUNTIME)
 install(TARGETS vmq vmqhost LIBRARY)
-install(FILES packaging/vmqd.conf.example docs/api.yaml docs/vmqd.md DESTINATION ${CMAKE_INSTALL_DOCDIR})
+install(FILES packaging/vmqd.conf.example docs/api.yaml docs/file-transfer.md docs/vmqd.md DESTINATION ${CMAKE_INSTALL_DOCDIR})
 
 # The unit names the program by its path.
 configure_file(packaging/vmqd.service ${PROJECT_BINARY_DIR}/packaging/vmqd.service @ONLY)
