@@ -4,8 +4,8 @@
 #include <sys/stat.h>
 
 #include <filesystem>
-#include <fstream>
 #include <string>
+#include <vector>
 
 #include "tests/apps/vmqd/test_daemon.h"
 
@@ -52,8 +52,9 @@ TEST(DepotRoute, KnowsOnlyRegularFiles) {
   daemon.directory().writeFile("depot/dir/file", "x");
   ASSERT_EQ(0, mkfifo((daemon.depot() + "/fifo").c_str(), 0600));
   std::filesystem::create_symlink("loop", daemon.depot() + "/loop");
-  for (const std::string name :
-       {"none", "dir", "dir/", "dir/file/more", "fifo", "loop", "%2Fetc%2Fpasswd", std::string(300, 'n').c_str()}) {
+  const std::vector<std::string> names = {
+      "none", "dir", "dir/", "dir/file/more", "fifo", "loop", "%2Fetc%2Fpasswd", std::string(300, 'n')};
+  for (const std::string& name : names) {
     SCOPED_TRACE(name);
     const HttpReply reply = client.get("/v1/depot/" + name);
     EXPECT_EQ(404, reply.status);
@@ -80,9 +81,9 @@ TEST(DepotRoute, LooksIntoTheHomeWhenNoDepotIsSet) {
 TEST(DepotRoute, RefusesPathsThatLeadOutOfTheDepot) {
   const TestDaemon daemon;
   HttpClient client(daemon.socket());
-  for (const std::string path : {"..", "../vmqd.conf", "dir/../file", "dir/..", "%2e%2e/vmqd.conf", "..%2Fvmqd.conf"}) {
+  for (const char* const path : {"..", "../vmqd.conf", "dir/../file", "dir/..", "%2e%2e/vmqd.conf", "..%2Fvmqd.conf"}) {
     SCOPED_TRACE(path);
-    const HttpReply reply = client.get("/v1/depot/" + path);
+    const HttpReply reply = client.get(std::string("/v1/depot/") + path);
     EXPECT_EQ(400, reply.status);
     EXPECT_EQ("bad_request", errorCode(reply));
   }
