@@ -111,6 +111,7 @@ TEST(RpcCalls, KnowWhatThereIsNot) {
   EXPECT_EQ(vmqhost::call({{{0x5B}}, 1}).outcome, RpcResult::kUnknownInterface);
   EXPECT_EQ(vmqhost::call({rpc__nil_type, 1}).outcome, RpcResult::kUnknownInterface);
   EXPECT_EQ(vmqhost::call({id, 2}).outcome, RpcResult::kUnknownVersion);
+  EXPECT_EQ(vmqhost::call({id, 0}).outcome, RpcResult::kUnknownVersion);
   EXPECT_EQ(vmqhost::call({id, 1, 2}).outcome, RpcResult::kUnknownOperation);
   EXPECT_EQ(vmqhost::call({id, 1, UINT32_MAX}).outcome, RpcResult::kUnknownOperation);
   EXPECT_EQ(vmqhost::call({id, 1, 0}).outcome, RpcResult::kReplied);
@@ -315,8 +316,8 @@ TEST(LabelText, NamesFourRepresentations) {
   for (const char* const text : {"00000000", "10000000", "01000000", "11000000"}) {
     EXPECT_EQ(labelOf(*parseLabel(text)), text);
   }
-  for (const char* const text : {"", "1", "1000000", "100000000", "20000000", "02000000", "f0000000", "10010000",
-                                 "10000001", "1000000 ", "-1000000", "x0000000"}) {
+  for (const char* const text : {"", "1", "1000000", "100000000", "20000000", "02000000", "10100000", "f0000000",
+                                 "10010000", "10000001", "1000000 ", "-1000000", "x0000000"}) {
     EXPECT_FALSE(parseLabel(text)) << text;
   }
 }
