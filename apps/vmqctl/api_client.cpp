@@ -3,6 +3,7 @@
 #include "apps/vmqctl/api_client.h"
 
 #include <algorithm>
+#include <bit>
 #include <cerrno>
 #include <cstring>
 
@@ -13,6 +14,8 @@ namespace {
 
 constexpr int httpOk = 200;
 constexpr int httpForbidden = 403;
+constexpr int httpNotFound = 404;
+constexpr int httpBusy = 503;
 
 constexpr const char* allowHint = "Run vmqctl as root or as a user in the daemon's allowed_uids.";
 constexpr const char* startHint =
@@ -72,20 +75,45 @@ std::string textAt(const Json& object, const char* pointer) {
   return object.is_object() && object.contains(at) && object[at].is_string() ? object[at].get<std::string>() : "";
 }
 
-/// Throws what an answer other than 200 says. The daemon's own words are shown.
-void checkStatus(long status, const std::string& body, const std::string& socket) {
+/// The code of an error answer, "" when it is none.
+std::string errorCode(const std::string& body) {
+  return textAt(Json::parse(body, /*cb=*/nullptr, /*allow_exceptions=*/false), "/error/code");
+}
+
+/// Throws what an answer other than 200 says, with this code unless another fits better. The daemon's own words are
+/// shown.
+void checkStatus(long status, const std::string& body, const std::string& socket, ExitCode code = ExitCode::Failed) {
   if (status == httpOk) return;
   const Json answer = Json::parse(body, /*cb=*/nullptr, /*allow_exceptions=*/false);
   std::string sentence = textAt(answer, "/error/message");
   if (sentence.empty()) {
     sentence = "The daemon on " + socket + " answers with HTTP status " + std::to_string(status) + ".";
   }
-  const std::string code = textAt(answer, "/error/code");
+  const std::string error = textAt(answer, "/error/code");
   const auto* hint =
-      std::find_if(std::begin(errorHints), std::end(errorHints), [&](const ErrorHint& h) { return h.code == code; });
-  throw Failure(status == httpForbidden ? ExitCode::NotAllowed : ExitCode::Failed, sentence,
+      std::find_if(std::begin(errorHints), std::end(errorHints), [&](const ErrorHint& h) { return h.code == error; });
+  throw Failure(status == httpForbidden ? ExitCode::NotAllowed : code, sentence,
                 hint == std::end(errorHints) ? "" : hint->next);
 }
+
+/// Waiting times that grow, between tries that found the daemon busy.
+class Backoff {
+ public:
+  /// Before the next try. The daemon knows best how long, within reason.
+  std::chrono::milliseconds next(std::chrono::seconds asked) {
+    const milliseconds own = next_;
+    next_ = std::min(2 * next_, longest);
+    return std::max(own, std::min<milliseconds>(asked, longest));
+  }
+
+ private:
+  using milliseconds = std::chrono::milliseconds;
+  static constexpr milliseconds longest{5000};
+  milliseconds next_{20};
+};
+
+/// Integers as on this machine, characters ASCII.
+constexpr const char* ownRepresentation = std::endian::native == std::endian::little ? "10000000" : "00000000";
 
 std::string tableTarget(const std::string& table) {
   return "/v1/tables/" + percentEncoded(table);
@@ -98,16 +126,61 @@ std::string eventsTarget(const std::string& table, const Predicates& predicates)
 
 }  // namespace
 
-Json ApiClient::exchange(const HttpRequest& request) {
+ApiClient::Answer ApiClient::answerTo(const HttpRequest& request) {
   Transfer transfer(loop_, request);
   loop_.until([&] { return transfer.ended(); });
   if (transfer.result() != CURLE_OK) connectionFailure(transfer, loop_.socket());
-  checkStatus(transfer.status(), transfer.body(), loop_.socket());
-  return parse(transfer.body(), loop_.socket());
+  return {transfer.status(), transfer.takeBody(), transfer.header("Data-Representation"), transfer.retryAfter()};
+}
+
+ApiClient::Answer ApiClient::patientAnswerTo(const HttpRequest& request) {
+  for (Backoff backoff;;) {
+    Answer answer = answerTo(request);
+    if (answer.status != httpBusy || errorCode(answer.body) != "busy") return answer;
+    try {
+      loop_.pause(backoff.next(answer.retryAfter));
+    } catch (const TimedOut&) {
+      checkStatus(answer.status, answer.body, loop_.socket(), ExitCode::TimedOut);
+    }
+  }
+}
+
+Json ApiClient::exchange(const HttpRequest& request) {
+  const Answer answer = answerTo(request);
+  checkStatus(answer.status, answer.body, loop_.socket());
+  return parse(answer.body, loop_.socket());
+}
+
+RpcReply ApiClient::call(const std::string& interface, unsigned operation, std::string_view packet) {
+  HttpRequest request = {"/v1/rpc/" + interface + "/" + std::to_string(operation)};
+  request.packet = packet;
+  request.headers = {std::string("Data-Representation: ") + ownRepresentation};
+  request.keepsConnection = true;
+  Answer answer = patientAnswerTo(request);
+  checkStatus(answer.status, answer.body, loop_.socket());
+  if (answer.representation != "10000000" && answer.representation != "00000000") {
+    throw AnswerLost(ExitCode::Failed, "The daemon's answer has no Data-Representation that is understood.",
+                     "Check that vmqd and vmqctl are of the same version.");
+  }
+  return {std::move(answer.body), answer.representation.front() == '1'};
+}
+
+std::optional<DepotFile> ApiClient::depotFile(const std::string& name) {
+  HttpRequest request = {"/v1/depot/" + percentEncodedPath(name)};
+  request.keepsConnection = true;
+  const Answer answer = patientAnswerTo(request);
+  if (answer.status == httpNotFound && errorCode(answer.body) == "not_found") return std::nullopt;
+  checkStatus(answer.status, answer.body, loop_.socket());
+  const Json file = parse(answer.body, loop_.socket());
+  const std::string sha256 = textAt(file, "/sha256");
+  if (sha256.empty() || !file.contains("size") || !file["size"].is_number_unsigned()) {
+    notUnderstood(loop_.socket(), "it does not describe a file");
+  }
+  return DepotFile{file["size"].get<std::uint64_t>(), sha256};
 }
 
 Json ApiClient::get(const std::string& target) {
-  Json answer = exchange({target, std::nullopt});
+  Json answer = exchange({target});
   if (!answer.is_object()) notUnderstood(loop_.socket(), "it is not a JSON object");
   return answer;
 }
@@ -131,7 +204,7 @@ std::vector<Json> ApiClient::query(const std::string& table, const Predicates& p
 }
 
 EventStream::EventStream(HttpLoop& loop, const std::string& table, const Predicates& predicates)
-    : loop_(loop), transfer_(loop, {eventsTarget(table, predicates), std::nullopt}) {
+    : loop_(loop), transfer_(loop, {eventsTarget(table, predicates)}) {
   const std::optional<ServerSentEvent> first = nextOfAnyName();
   if (!first) {
     throw Failure(ExitCode::NotReachable,

@@ -41,14 +41,16 @@ void addCommonOptions(CLI::App& verb, Invocation& invocation, unsigned defaultTi
 
 std::optional<std::string> parseCommandLine(int argc, const char* const* argv, CommandLine& result) {
   Invocation invocation;
-  CLI::App app("Starts, stops, installs, configures and lists the agents of this machine through the daemon vmqd.",
+  CLI::App app("Starts, stops, deploys, configures and lists the agents of this machine through the daemon vmqd.",
                "vmqctl");
   app.set_version_flag("--version", "vmqctl " VMQ_VERSION, "Print the version and end");
   app.set_help_flag("-h,--help", "Print this and end");
   app.require_subcommand(0, 1);  // none at all is told below, in words that fit a mistyped verb too
   addPlaceOptions(app, invocation.settings);
-  for (const auto add : {addAgentVerbs, addProductVerbs, addInventory, addQuery, addWatch, addStatus})
+  for (const auto add :
+       {addAgentVerbs, addPush, addDeploy, addProductVerbs, addInventory, addQuery, addWatch, addStatus}) {
     add(app, invocation);
+  }
   app.footer(
       "Each verb has its own --help.\n"
       "Example:\n"

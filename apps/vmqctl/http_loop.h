@@ -9,6 +9,8 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
+#include <vector>
 
 #include "apps/vmqctl/interrupts.h"
 #include "apps/vmqctl/progress.h"
@@ -16,8 +18,12 @@
 namespace vmqctl {
 
 struct HttpRequest {
-  std::string target;               ///< path and query, encoded
-  std::optional<std::string> body;  ///< JSON to post; a GET without it
+  std::string target;                              ///< path and query, encoded
+  std::optional<std::string> body = std::nullopt;  ///< JSON to post; a GET without it
+  /// Posted in place of body. Not copied: it must stay until the transfer has ended.
+  std::optional<std::string_view> packet = std::nullopt;
+  std::vector<std::string> headers = {};  ///< further ones: "NAME: VALUE"
+  bool keepsConnection = false;           ///< for the next request that does, too
 };
 
 class HttpLoop;
@@ -40,6 +46,10 @@ class Transfer {
   /// What has arrived of the body and was not taken yet.
   [[nodiscard]] const std::string& body() const { return body_; }
   std::string takeBody();
+  /// The value of a header of the answer, "" without it.
+  [[nodiscard]] std::string header(const char* name) const;
+  /// How long the answer asks to wait before the next try.
+  [[nodiscard]] std::chrono::seconds retryAfter() const;
 
  private:
   friend class HttpLoop;
@@ -50,9 +60,17 @@ class Transfer {
     void operator()(curl_slist* list) const { curl_slist_free_all(list); }
   };
   static std::size_t write(char* data, std::size_t size, std::size_t count, void* self) noexcept;
+  static std::size_t readPacket(char* to, std::size_t size, std::size_t count, void* self) noexcept;
+  static int rewindPacket(void* self, curl_off_t offset, int origin) noexcept;
+
+  void addHeader(const std::string& header);
+  void post(const std::string& json);
+  void post(std::string_view packet);
 
   HttpLoop& loop_;
   std::string body_;
+  std::string_view unsent_;  // of a packet
+  bool begun_ = false;       // a part of the packet has been handed out
   std::optional<CURLcode> result_;
   std::unique_ptr<curl_slist, ListDeleter> headers_;
   std::unique_ptr<CURL, HandleDeleter> handle_;
@@ -70,6 +88,9 @@ class HttpLoop {
   /// Lets the transfers go on until done() says so. Throws Interrupted or TimedOut when that comes first.
   void until(const std::function<bool()>& done);
 
+  /// Lets time pass. Throws as until() does.
+  void pause(std::chrono::milliseconds time);
+
   /// True once the time is up. until() still lets pass what has come by then.
   [[nodiscard]] bool expired() const { return end_ && Clock::now() >= *end_; }
 
@@ -80,7 +101,9 @@ class HttpLoop {
   using Clock = std::chrono::steady_clock;
 
   void step();
-  [[nodiscard]] int pollMilliseconds() const;
+  void until(const std::function<bool()>& done, Clock::time_point wake);
+  /// Up to what comes first: the next tick, the end of the time, `wake`.
+  [[nodiscard]] int pollMilliseconds(Clock::time_point wake) const;
 
   const std::string socket_;
   Progress& progress_;

@@ -17,6 +17,22 @@ struct Operator {
 // The longer sign before the one that it begins with.
 constexpr Operator operators[] = {{"!=", "ne"}, {"<=", "le"}, {">=", "ge"}, {"=", "eq"}, {"<", "lt"}, {">", "gt"}};
 
+const std::string unreserved = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789-._~";
+
+std::string encoded(std::string_view text, std::string_view plain) {
+  constexpr std::string_view digits = "0123456789ABCDEF";
+  std::string result;
+  for (const char c : text) {
+    if (plain.find(c) != std::string_view::npos) {
+      result += c;
+    } else {
+      const auto byte = static_cast<unsigned char>(c);
+      result += {'%', digits[byte >> 4], digits[byte & 15]};
+    }
+  }
+  return result;
+}
+
 }  // namespace
 
 Predicate parsePredicate(std::string_view text) {
@@ -44,18 +60,11 @@ Json toJson(const Predicates& predicates) {
 }
 
 std::string percentEncoded(std::string_view text) {
-  constexpr std::string_view plain = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789-._~";
-  constexpr std::string_view digits = "0123456789ABCDEF";
-  std::string result;
-  for (const char c : text) {
-    if (plain.find(c) != std::string_view::npos) {
-      result += c;
-    } else {
-      const auto byte = static_cast<unsigned char>(c);
-      result += {'%', digits[byte >> 4], digits[byte & 15]};
-    }
-  }
-  return result;
+  return encoded(text, unreserved);
+}
+
+std::string percentEncodedPath(std::string_view path) {
+  return encoded(path, unreserved + "/");
 }
 
 std::string toQueryString(const Predicates& predicates) {

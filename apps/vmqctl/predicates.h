@@ -32,4 +32,7 @@ std::string toQueryString(const Predicates& predicates);
 /// The text with everything but letters, digits and "-._~" as "%" and two digits.
 std::string percentEncoded(std::string_view text);
 
+/// The same, but "/" stays.
+std::string percentEncodedPath(std::string_view path);
+
 }  // namespace vmqctl

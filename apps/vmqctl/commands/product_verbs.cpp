@@ -4,6 +4,7 @@
 #include <vector>
 
 #include "apps/vmqctl/commands/input_text.h"
+#include "apps/vmqctl/commands/install_request.h"
 #include "apps/vmqctl/commands/request_options.h"
 #include "apps/vmqctl/commands/result.h"
 #include "apps/vmqctl/failure.h"
@@ -12,16 +13,10 @@ namespace vmqctl {
 namespace {
 
 constexpr unsigned configurationTimeoutSeconds = 600;
-constexpr unsigned installationTimeoutSeconds = 7200;  // installers of large products, and what waits before them
 constexpr std::size_t contextColumnBytes = 3072;
 
 /// Everything that the verbs here can be told; each takes what it needs.
-struct Arguments {
-  std::string product;
-  std::string version;
-  std::string installer;
-  bool setRms = false;
-  bool restart = false;
+struct Arguments : InstallArguments {
   std::string target;
   std::string file;
   std::string model;
@@ -29,10 +24,6 @@ struct Arguments {
   unsigned port = 0;
   RequestArguments request;
 };
-
-void addParameter(Request& request, const char* column, const std::string& value) {
-  if (!value.empty()) request.parameters.push_back({column, "eq", value});
-}
 
 std::string joined(const std::vector<std::string>& words) {
   std::string text;
@@ -43,37 +34,15 @@ std::string joined(const std::vector<std::string>& words) {
 // ---- options
 // ---------------------------------------------------------------------------------------------------------
 
-void takesProduct(CLI::App& verb, Arguments& a) {
-  verb.add_option("PRODUCT", a.product, "Product code, such as ux")->type_name("")->required()->check(notEmpty);
-}
-
 void takesTarget(CLI::App& verb, Arguments& a, const char* description) {
   verb.add_option("--target", a.target, description)->type_name("MSN")->check(notEmpty);
-}
-
-void takesVersion(CLI::App& verb, Arguments& a, bool required) {
-  verb.add_option("--version", a.version, "Version of the product, such as 06.20")
-      ->type_name("V")
-      ->required(required)
-      ->check(notEmpty);
-}
-
-void takesCommand(CLI::App& verb, Arguments& a, bool required, const char* description) {
-  verb.add_option("--command", a.installer,
-                  std::string(description) + "; |DEPLOYDIR|, |DEPOTDIR| and |CORVELHOME| are replaced")
-      ->type_name("CMD")
-      ->required(required)
-      ->check(notEmpty);
 }
 
 void addInstallOptions(CLI::App& verb, Arguments& a) {
   takesProduct(verb, a);
   takesVersion(verb, a, /*required=*/true);
   takesCommand(verb, a, /*required=*/true, "The installer's command line");
-  CLI::Option* const setRms =
-      verb.add_flag("--set-rms", a.setRms, "Afterwards register the product with its management server");
-  verb.add_flag("--restart", a.restart, "The installer restarts vmqd; ask complete-install for its outcome")
-      ->excludes(setRms);
+  takesInstallSteps(verb, a);
 }
 
 void addUninstallOptions(CLI::App& verb, Arguments& a) {
@@ -115,13 +84,7 @@ void addNoOptions(CLI::App&, Arguments&) {}
 // --------------------------------------------------------------------------------------------------------
 
 void buildInstall(Request& request, const Arguments& a) {
-  addParameter(request, "VERSION", a.version);
-  addParameter(request, "CONTEXT", a.installer);
-  if (a.setRms) addParameter(request, "OPTIONAL", "SETRMS");
-  if (a.restart) {
-    addParameter(request, "OPTIONAL", "REQUIRES_RESTART");
-    request.afterSuccess = "The installer runs on by itself. Ask for its outcome with: vmqctl complete-install.";
-  }
+  request = installRequest(a);
 }
 
 void buildUninstall(Request& request, const Arguments& a) {

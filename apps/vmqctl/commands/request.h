@@ -25,6 +25,7 @@ struct Request {
 struct RequestOptions {
   std::string transactionId;  ///< not empty
   bool wait = true;           ///< for the status event of a queued command
+  Json push = nullptr;        ///< what was sent to the depot before it: the member "push" of its JSON; null for none
 };
 
 /// The value of a parameter, "" without it.

@@ -32,8 +32,12 @@ void addRequestOptions(CLI::App& verb, RequestArguments& arguments, Request::Out
   verb.add_flag("--dry-run", arguments.dryRun, "Show the request that would be sent, and send nothing");
 }
 
+std::string transactionIdFor(const RequestArguments& arguments) {
+  return arguments.transactionId.empty() ? newTransactionId() : arguments.transactionId;
+}
+
 Action requestAction(const Request& request, const RequestArguments& arguments, unsigned defaultTimeoutSeconds) {
-  const std::string transactionId = arguments.transactionId.empty() ? newTransactionId() : arguments.transactionId;
+  const std::string transactionId = transactionIdFor(arguments);
   if (arguments.dryRun) {
     (void)toJson(predicatesOf(request, transactionId));  // refuses what could not be sent
     return {defaultTimeoutSeconds,

@@ -19,6 +19,9 @@ struct RequestArguments {
 /// Adds --transid, --dry-run and, for a command whose outcome comes later, --no-wait.
 void addRequestOptions(CLI::App& verb, RequestArguments& arguments, Request::Outcome outcome);
 
+/// The transaction id that was given, or a new one.
+std::string transactionIdFor(const RequestArguments& arguments);
+
 /// Sends the request, or shows what would be sent. `dryRun` shows on standard output, as JSON, the body of the HTTP
 /// request; nothing is sent.
 Action requestAction(const Request& request, const RequestArguments& arguments, unsigned defaultTimeoutSeconds);

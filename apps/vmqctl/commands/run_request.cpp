@@ -103,18 +103,19 @@ Report exchange(Session& session, const Request& request, const RequestOptions& 
 
 void write(const Session& session, const Request& request, const RequestOptions& options, const Report& report) {
   if (session.format == Format::AsJson) {
-    session.console.data(jsonText({{"result", report.result},
-                                   {"command", request.command},
-                                   {"product", parameter(request, "PRODUCT")},
-                                   {"target", parameter(request, "TARGETMSN")},
-                                   {"transid", options.transactionId},
-                                   {"retval", report.details.returnValue},
-                                   {"message_id", report.details.messageId},
-                                   {"message", messageText(report.details.messageId)},
-                                   {"parameters", report.details.parameters},
-                                   {"answer", report.answer},
-                                   {"event", report.event}},
-                                  /*oneLine=*/false, session.console.out()));
+    Json object = {{"result", report.result},
+                   {"command", request.command},
+                   {"product", parameter(request, "PRODUCT")},
+                   {"target", parameter(request, "TARGETMSN")},
+                   {"transid", options.transactionId},
+                   {"retval", report.details.returnValue},
+                   {"message_id", report.details.messageId},
+                   {"message", messageText(report.details.messageId)},
+                   {"parameters", report.details.parameters},
+                   {"answer", report.answer},
+                   {"event", report.event}};
+    if (!options.push.is_null()) object["push"] = options.push;
+    session.console.data(jsonText(object, /*oneLine=*/false, session.console.out()));
     return;
   }
   const Json row = {{"COMMAND", request.command},

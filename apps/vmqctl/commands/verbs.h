@@ -15,6 +15,8 @@ struct Invocation {
 
 void addAgentVerbs(CLI::App& app, Invocation& invocation);    ///< start, stop, restart
 void addProductVerbs(CLI::App& app, Invocation& invocation);  ///< install to set-da-config
+void addPush(CLI::App& app, Invocation& invocation);
+void addDeploy(CLI::App& app, Invocation& invocation);
 void addInventory(CLI::App& app, Invocation& invocation);
 void addQuery(CLI::App& app, Invocation& invocation);
 void addWatch(CLI::App& app, Invocation& invocation);

@@ -30,9 +30,22 @@ bool Exchange::send(const std::string& bytes) const {
   return true;
 }
 
-void Exchange::reply(int status, const std::string& json) const {
-  send("HTTP/1.1 " + std::to_string(status) +
-       " X\r\nContent-Type: application/json\r\nContent-Length: " + std::to_string(json.size()) + "\r\n\r\n" + json);
+std::string Exchange::target() const {
+  const std::size_t begin = head_.find(' ') + 1;
+  return head_.substr(begin, head_.find(" HTTP/1.1\r\n") - begin);
+}
+
+void Exchange::reply(int status, const std::string& json, const std::string& headers) {
+  reply(status, "application/json", headers, json);
+}
+
+void Exchange::replyPacket(const std::string& bytes, const std::string& representation) {
+  reply(200, "application/octet-stream", "Data-Representation: " + representation + "\r\n", bytes);
+}
+
+void Exchange::reply(int status, const std::string& type, const std::string& headers, const std::string& body) {
+  kept_ = send("HTTP/1.1 " + std::to_string(status) + " X\r\nContent-Type: " + type + "\r\n" + headers +
+               "Content-Length: " + std::to_string(body.size()) + "\r\n\r\n" + body);
 }
 
 void Exchange::openStream() const {
@@ -78,6 +91,11 @@ void ScriptedDaemon::on(const std::string& request, Handler handler) {
   handlers_[request] = std::move(handler);
 }
 
+void ScriptedDaemon::onAsked(const std::string& request, Handler handler) {
+  const std::lock_guard lock(mutex_);
+  asked_[request] = std::move(handler);
+}
+
 std::vector<std::string> ScriptedDaemon::log() {
   const std::lock_guard lock(mutex_);
   return log_;
@@ -98,35 +116,59 @@ void ScriptedDaemon::accept() {
   }
 }
 
-void ScriptedDaemon::serve(int connection) {
-  std::string text;
-  std::size_t headEnd = std::string::npos;
+ScriptedDaemon::Handler ScriptedDaemon::handlerFor(const std::map<std::string, Handler>& handlers,
+                                                   const std::string& line) {
+  const std::lock_guard lock(mutex_);
+  const auto found = handlers.find(line.substr(0, line.find('?')));
+  return found == handlers.end() ? Handler() : found->second;
+}
+
+/// One request. `received` holds what has been read of it, and in the end what has been read beyond it. True when
+/// another may follow.
+bool ScriptedDaemon::serveOne(int connection, std::string& received) {
   std::size_t length = 0;
-  while (headEnd == std::string::npos || text.size() < headEnd + length) {
-    char buffer[4096];
+  std::string head;
+  std::string line;
+  while (head.empty() || received.size() < head.size() + length) {
+    char buffer[65536];
     const ssize_t count = recv(connection, buffer, sizeof buffer, 0);
     if (count <= 0) break;
-    text.append(buffer, static_cast<std::size_t>(count));
-    if (headEnd == std::string::npos && text.find("\r\n\r\n") != std::string::npos) {
-      headEnd = text.find("\r\n\r\n") + 4;
-      const std::string name = "Content-Length: ";
-      const std::size_t at = text.find(name);
-      if (at < headEnd) length = std::stoul(text.substr(at + name.size()));
+    received.append(buffer, static_cast<std::size_t>(count));
+    const std::size_t end = head.empty() ? received.find("\r\n\r\n") : std::string::npos;
+    if (end == std::string::npos) continue;
+    head = received.substr(0, end + 4);
+    line = head.substr(0, head.find(" HTTP/1.1\r\n"));
+    const std::string name = "Content-Length: ";
+    if (const std::size_t at = head.find(name); at != std::string::npos)
+      length = std::stoul(head.substr(at + name.size()));
+    if (head.find("\r\nExpect: 100-continue\r\n") == std::string::npos) continue;
+    if (const Handler handler = handlerFor(asked_, line)) {
+      Exchange exchange(connection, head, "");
+      handler(exchange);
+      if (!exchange.kept()) {  // not answered: the body may come
+        exchange.send("HTTP/1.1 100 Continue\r\n\r\n");
+        continue;
+      }
+      note(line);
+      return false;
     }
+    (void)Exchange(connection, head, "").send("HTTP/1.1 100 Continue\r\n\r\n");
   }
-  if (headEnd != std::string::npos) {
-    const std::string line = text.substr(0, text.find(" HTTP/1.1\r\n"));
-    Handler handler = [](Exchange& exchange) {
-      exchange.reply(404, R"({"error":{"code":"unknown_route","message":"There is nothing here."}})");
-    };
-    {
-      const std::lock_guard lock(mutex_);
-      log_.push_back(line);
-      const auto found = handlers_.find(line.substr(0, line.find('?')));
-      if (found != handlers_.end()) handler = found->second;
-    }
-    Exchange exchange(connection, line.substr(line.find(' ') + 1), text.substr(headEnd));
+  if (head.empty()) return false;
+  note(line);
+  Exchange exchange(connection, head, received.substr(head.size(), length));
+  received.erase(0, head.size() + length);
+  if (const Handler handler = handlerFor(handlers_, line)) {
     handler(exchange);
+  } else {
+    exchange.reply(404, R"({"error":{"code":"unknown_route","message":"There is nothing here."}})");
+  }
+  return exchange.kept();
+}
+
+void ScriptedDaemon::serve(int connection) {
+  std::string received;
+  while (serveOne(connection, received)) {
   }
   const std::lock_guard lock(mutex_);
   std::erase(connections_, connection);

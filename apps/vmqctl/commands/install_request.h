@@ -1,0 +1,34 @@
+#pragma once
+// The request that runs a product's installer, and its options: for every verb that ends in an install.
+
+#include <CLI/CLI.hpp>
+#include <string>
+
+#include "apps/vmqctl/commands/request.h"
+
+namespace vmqctl {
+
+/// Installers of large products take long, and so does what waits before them.
+inline constexpr unsigned installationTimeoutSeconds = 7200;
+
+struct InstallArguments {
+  std::string product;
+  std::string version;
+  std::string installer;  ///< a command line with placeholders
+  bool setRms = false;
+  bool restart = false;
+};
+
+void takesProduct(CLI::App& verb, InstallArguments& arguments);
+void takesVersion(CLI::App& verb, InstallArguments& arguments, bool required);
+/// --command; `description` begins its help.
+void takesCommand(CLI::App& verb, InstallArguments& arguments, bool required, const char* description);
+/// --set-rms and --restart.
+void takesInstallSteps(CLI::App& verb, InstallArguments& arguments);
+
+Request installRequest(const InstallArguments& arguments);
+
+/// Adds a parameter unless it is empty.
+void addParameter(Request& request, const char* column, const std::string& value);
+
+}  // namespace vmqctl
