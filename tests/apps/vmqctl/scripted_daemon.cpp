@@ -106,6 +106,11 @@ void ScriptedDaemon::note(const std::string& text) {
   log_.push_back(text);
 }
 
+std::size_t ScriptedDaemon::connections() {
+  const std::lock_guard lock(mutex_);
+  return threads_.size();  // each has one
+}
+
 void ScriptedDaemon::accept() {
   for (;;) {
     const int connection = accept4(listener_, nullptr, nullptr, SOCK_CLOEXEC);

@@ -81,6 +81,8 @@ class ScriptedDaemon {
   /// What happened, in order: each request's first line, "GET /v1", and whatever handlers add.
   [[nodiscard]] std::vector<std::string> log();
   void note(const std::string& text);
+  /// How many connections have been made.
+  [[nodiscard]] std::size_t connections();
 
  private:
   void accept();

@@ -75,14 +75,15 @@ TEST(Usage, VersionIsPrinted) {
 TEST(Usage, HelpListsTheVerbsAndTheExitCodes) {
   const VmqctlResult result = runVmqctl({"--help"});
   EXPECT_EQ(result.code, 0);
-  for (const char* text : {"start", "stop", "restart", "query", "watch", "status", "--version", "130 interrupted"}) {
+  for (const char* text :
+       {"start", "stop", "push", "deploy", "query", "watch", "status", "--version", "130 interrupted"}) {
     EXPECT_THAT(result.out, HasSubstr(text));
   }
   EXPECT_EQ(result.err, "");
 }
 
 TEST(Usage, HelpOfEachVerbHasAnExampleAndTheCommonOptions) {
-  for (const std::string verb : {"start", "stop", "restart", "query", "watch", "status"}) {
+  for (const std::string verb : {"start", "stop", "restart", "push", "deploy", "query", "watch", "status"}) {
     const VmqctlResult result = runVmqctl({verb, "--help"});
     EXPECT_EQ(result.code, 0);
     EXPECT_THAT(result.out,
