@@ -49,8 +49,11 @@ Json plannedFiles(const PushPlan& plan) {
 }
 
 void showFiles(const Session& session, const PushPlan& plan) {
-  const std::vector<Json> rows = plannedFiles(plan);
-  session.console.data(table({"name", "bytes", "source"}, rows, layoutFor(session.console.out())));
+  std::vector<Json> rows;
+  for (const PlannedFile& file : plan.files()) {
+    rows.push_back({{"NAME", file.name}, {"BYTES", file.bytes}, {"SOURCE", file.source}});
+  }
+  session.console.data(table({"NAME", "BYTES", "SOURCE"}, rows, layoutFor(session.console.out())));
 }
 
 std::string notSentLine() {
@@ -164,7 +167,7 @@ void addPush(CLI::App& app, Invocation& invocation) {
   const auto arguments = std::make_shared<PushArguments>();
   CLI::App* const sub = app.add_subcommand("push", "Send files and folders to the depot.");
   sub->add_option("FILE|DIR", arguments->sources, "What to send; a folder with everything in it, under its own name")
-      ->type_name("...")
+      ->type_name("")
       ->required()
       ->check(notEmpty);
   sub->add_option("--to", arguments->folder, "The folder in the depot to put it in (default: the depot itself)")

@@ -221,7 +221,7 @@ TEST_F(Push, DryRunSendsNothing) {
   directory_.writeFile("ux/a", "123");
   const VmqctlResult result = run({"push", directory_ / "ux", "--dry-run"});
   EXPECT_EQ(result.code, 0);
-  EXPECT_EQ(result.out, "name  bytes  source\nux/a      3  " + directory_ / "ux/a" + "\n");
+  EXPECT_EQ(result.out, "NAME  BYTES  SOURCE\nux/a      3  " + directory_ / "ux/a" + "\n");
   EXPECT_EQ(result.err, "not sent: " + rpcRequest + " for each file\n");
   EXPECT_EQ(
       run({"push", directory_ / "ux", "--dry-run", "-o", "json"}).out,
@@ -676,7 +676,7 @@ TEST_F(Deploy, DryRunShowsFilesAndRequest) {
                               R"("CONTEXT":"|DEPLOYDIR|/install.sh |CORVELHOME|"}})";
   const VmqctlResult result = deploy({"ux", "--version", "1", "--dry-run"});
   EXPECT_EQ(result.code, 0);
-  EXPECT_EQ(result.out, "name             bytes  source\nux/1/install.sh     10  " + directory_ / "bundle/install.sh" +
+  EXPECT_EQ(result.out, "NAME             BYTES  SOURCE\nux/1/install.sh     10  " + directory_ / "bundle/install.sh" +
                             "\nux/1/lib/x           1  " + directory_ / "bundle/lib/x" + "\n" +
                             Json::parse(request).dump(2) + "\n");
   EXPECT_EQ(result.err, "not sent: " + rpcRequest + " for each file\nnot sent: POST /v1/tables/KAGREQT/query\n");
