@@ -47,13 +47,31 @@ double secondsFor(const std::function<void()>& work) {
   return Seconds(Clock::now() - begin).count();
 }
 
-struct ChildCost {
+struct Cost {
   double seconds = 0;
-  double peakKilobytes = 0;
+  double cpuSeconds = 0;        ///< of the program that was run, or of this one
+  double daemonCpuSeconds = 0;  ///< meanwhile
 };
 
-/// Runs a program to its end. Its output is thrown away.
-ChildCost run(std::vector<std::string> arguments) {
+double inSeconds(const timeval& time) {
+  return static_cast<double>(time.tv_sec) + static_cast<double>(time.tv_usec) * 1e-6;
+}
+
+double cpuSecondsIn(const rusage& usage) {
+  return inSeconds(usage.ru_utime) + inSeconds(usage.ru_stime);
+}
+
+/// The most memory that a process has held so far; 0 when it is gone.
+double peakKilobytes(pid_t pid) {
+  std::ifstream status("/proc/" + std::to_string(pid) + "/status");
+  for (std::string line; std::getline(status, line);) {
+    if (line.rfind("VmHWM:", 0) == 0) return std::atof(line.c_str() + 6);
+  }
+  return 0;
+}
+
+/// Starts a program. Its output is thrown away.
+pid_t start(std::vector<std::string> arguments) {
   std::vector<char*> pointers;
   for (std::string& argument : arguments) pointers.push_back(argument.data());
   pointers.push_back(nullptr);
@@ -62,19 +80,35 @@ ChildCost run(std::vector<std::string> arguments) {
   for (const int stream : {STDOUT_FILENO, STDERR_FILENO}) {
     posix_spawn_file_actions_addopen(&files, stream, "/dev/null", O_WRONLY, 0);
   }
-  ChildCost cost;
-  rusage usage = {};
+  pid_t pid = -1;
+  const int error = posix_spawnp(&pid, pointers[0], &files, nullptr, pointers.data(), environ);
+  posix_spawn_file_actions_destroy(&files);
+  if (error != 0) throw std::runtime_error(arguments[0] + " does not start");
+  return pid;
+}
+
+/// Runs a program to its end.
+Cost run(const std::vector<std::string>& arguments) {
   int status = -1;
-  cost.seconds = secondsFor([&] {
-    pid_t pid = -1;
-    if (posix_spawnp(&pid, pointers[0], &files, nullptr, pointers.data(), environ) != 0) return;
+  rusage usage = {};
+  const double seconds = secondsFor([&] {
+    const pid_t pid = start(arguments);
     while (wait4(pid, &status, 0, &usage) < 0 && errno == EINTR) {
     }
   });
-  posix_spawn_file_actions_destroy(&files);
   if (status != 0) throw std::runtime_error(arguments[0] + " fails");
-  cost.peakKilobytes = static_cast<double>(usage.ru_maxrss);
-  return cost;
+  return {seconds, cpuSecondsIn(usage)};
+}
+
+/// The same, and looks at its memory instead of its speed.
+double peakKilobytesOf(const std::vector<std::string>& arguments) {
+  const pid_t pid = start(arguments);
+  double peak = 0;
+  while (waitpid(pid, nullptr, WNOHANG) == 0) {
+    peak = std::max(peak, peakKilobytes(pid));
+    usleep(1000);
+  }
+  return peak;
 }
 
 /// A vmqd whose depot and whose files to push are on one file system.
@@ -89,38 +123,57 @@ class Scene {
   }
   [[nodiscard]] std::string path(const std::string& name) const { return (directory_ / name).string(); }
 
-  ChildCost push() const {
-    fs::remove_all(path("depot/files"));
-    return run({VMQ_CLIENT, "push", path("files"), "--socket", path("s")});
+  Cost push() const {
+    return withDaemon([&] { return run(pushArguments()); });
   }
+  double clientPeakKilobytes() const { return peakKilobytesOf(pushArguments()); }
   /// Holes are written out, and nothing is shared: what a transfer has to do as well.
-  ChildCost copy() const {
+  Cost copy() const {
     fs::remove_all(path("copy"));
     return run({"cp", "-r", "--sparse=never", "--reflink=never", path("files"), path("copy")});
   }
   /// The packets of a push, made and sent as vmqctl does, to an operation that does not exist.
-  double postToNothing() const {
+  Cost postToNothing() const {
+    return withDaemon([&] {
+      rusage before = {}, after = {};
+      (void)getrusage(RUSAGE_SELF, &before);  // cannot fail
+      const double seconds = secondsFor([&] { postFilesToNothing(); });
+      (void)getrusage(RUSAGE_SELF, &after);
+      return Cost{seconds, cpuSecondsIn(after) - cpuSecondsIn(before)};
+    });
+  }
+  [[nodiscard]] double daemonPeakKilobytes() const { return peakKilobytes(process_.pid()); }
+
+ private:
+  std::vector<std::string> pushArguments() const {
+    fs::remove_all(path("depot/files"));
+    return {VMQ_CLIENT, "push", path("files"), "--socket", path("s")};
+  }
+  Cost withDaemon(const std::function<Cost()>& work) const {
+    const double before = daemonCpuSeconds();
+    Cost cost = work();
+    cost.daemonCpuSeconds = daemonCpuSeconds() - before;
+    return cost;
+  }
+  double daemonCpuSeconds() const {
+    std::ifstream stat("/proc/" + std::to_string(process_.pid()) + "/stat");
+    std::string word;
+    for (int field = 1; field < 14; ++field) stat >> word;  // "(vmqd)" is one word
+    double user = 0, system = 0;
+    stat >> user >> system;
+    return (user + system) / static_cast<double>(sysconf(_SC_CLK_TCK));
+  }
+  void postFilesToNothing() const {
     const vmqctl::Stream nowhere;
     const vmqctl::Console console(nowhere, nowhere);
     vmqctl::Settings settings;
     settings.socket = path("s");
     vmqctl::PushPlan plan;
     plan.add(path("files"), "");
-    return secondsFor([&] {
-      vmqctl::Session session(console, settings, 0);
-      vmqctl::Packet packet(session.client.get("/v1").at("maximum_packet_bytes").get<std::size_t>());
-      for (const vmqctl::PlannedFile& file : plan.files()) postToNothing(session.client, packet, file);
-    });
+    vmqctl::Session session(console, settings, 0);
+    vmqctl::Packet packet(session.client.get("/v1").at("maximum_packet_bytes").get<std::size_t>());
+    for (const vmqctl::PlannedFile& file : plan.files()) postToNothing(session.client, packet, file);
   }
-  [[nodiscard]] double daemonPeakKilobytes() const {
-    std::ifstream status("/proc/" + std::to_string(process_.pid()) + "/status");
-    for (std::string line; std::getline(status, line);) {
-      if (line.rfind("VmHWM:", 0) == 0) return std::atof(line.c_str() + 6);
-    }
-    throw std::runtime_error("no VmHWM");
-  }
-
- private:
   static void postToNothing(vmqctl::ApiClient& client, vmqctl::Packet& packet, const vmqctl::PlannedFile& file) {
     vmqctl::SourceFile source(file.source);
     std::uint64_t left = source.bytes();
@@ -153,31 +206,45 @@ class Scene {
   DaemonProcess process_;
 };
 
-double median(std::vector<double> values) {
-  std::nth_element(values.begin(), values.begin() + static_cast<long>(values.size() / 2), values.end());
-  return values[values.size() / 2];
-}
+/// A series of costs, and the middle one of each kind.
+class Costs {
+ public:
+  void add(const Cost& cost) { costs_.push_back(cost); }
+  [[nodiscard]] double median(double Cost::*kind) const {
+    std::vector<double> values;
+    for (const Cost& cost : costs_) values.push_back(cost.*kind);
+    std::nth_element(values.begin(), values.begin() + static_cast<long>(values.size() / 2), values.end());
+    return values[values.size() / 2];
+  }
+
+ private:
+  std::vector<Cost> costs_;
+};
 
 /// The three in turns, so that all see the same machine. The ratios are of speed: 1 is as fast, 0.5 takes twice as
 /// long.
 void compare(benchmark::State& state, const Scene& scene, double bytes) {
-  std::vector<double> pushes, copies, posts;
-  double clientPeak = 0;
+  Costs pushes, copies, posts;
   for (auto _ : state) {
-    const ChildCost push = scene.push();
-    pushes.push_back(push.seconds);
-    clientPeak = std::max(clientPeak, push.peakKilobytes);
-    copies.push_back(scene.copy().seconds);
-    posts.push_back(scene.postToNothing());
+    const Cost push = scene.push();
+    pushes.add(push);
+    copies.add(scene.copy());
+    posts.add(scene.postToNothing());
     state.SetIterationTime(push.seconds);
   }
-  constexpr double mebibyte = 1024 * 1024;
-  state.counters["push_MiB_per_s"] = bytes / mebibyte / median(pushes);
-  state.counters["cp_MiB_per_s"] = bytes / mebibyte / median(copies);
-  state.counters["empty_route_MiB_per_s"] = bytes / mebibyte / median(posts);
-  state.counters["of_cp"] = median(copies) / median(pushes);
-  state.counters["of_empty_route"] = median(posts) / median(pushes);
-  state.counters["client_peak_kB"] = clientPeak;
+  const auto rate = [&](const Costs& costs) { return bytes / (1024 * 1024) / costs.median(&Cost::seconds); };
+  state.counters["push_MiB_per_s"] = rate(pushes);
+  state.counters["cp_MiB_per_s"] = rate(copies);
+  state.counters["empty_route_MiB_per_s"] = rate(posts);
+  state.counters["of_cp"] = rate(pushes) / rate(copies);
+  state.counters["of_empty_route"] = rate(pushes) / rate(posts);
+  // Where other work disturbs the rates, these still tell.
+  state.counters["push_client_cpu_s"] = pushes.median(&Cost::cpuSeconds);
+  state.counters["push_daemon_cpu_s"] = pushes.median(&Cost::daemonCpuSeconds);
+  state.counters["empty_route_client_cpu_s"] = posts.median(&Cost::cpuSeconds);
+  state.counters["empty_route_daemon_cpu_s"] = posts.median(&Cost::daemonCpuSeconds);
+  state.counters["cp_cpu_s"] = copies.median(&Cost::cpuSeconds);
+  state.counters["client_peak_kB"] = scene.clientPeakKilobytes();
   state.counters["daemon_peak_kB"] = scene.daemonPeakKilobytes();
 }
 

@@ -618,6 +618,12 @@ TEST_F(Deploy, SendsTheBundleToWhereTheInstallLooksAndInstalls) {
             "asking vmqd for INSTALL of ux, transaction t1\n");
 }
 
+TEST_F(Deploy, InstallIsAskedForOnAConnectionOfItsOwn) {
+  // On the one that was kept for the packets, the library might send the request twice.
+  EXPECT_EQ(deploy({"ux", "--version", "1"}).code, 0);
+  EXPECT_EQ(daemon_.connections(), 3U);
+}
+
 TEST_F(Deploy, ServicesOfTheInstallationLieWithoutAVersion) {
   EXPECT_EQ(deploy({"ci", "--version", "06.20"}).code, 0);
   EXPECT_THAT(labels(), ElementsAre("ci/install.sh#1", "ci/lib/x#1"));
