@@ -50,6 +50,12 @@ std::map<std::string, std::string> configuredBy(const std::string& configuration
   return files({{"config/um_inst1.config", configuration}});
 }
 
+std::map<std::string, std::string> configuredByDirectory() {
+  auto changed = without("config/um_inst1.config");
+  changed["config/um_inst1.config/file"] = "";
+  return changed;
+}
+
 std::string withoutKey(const std::string& key) {
   std::string text = kConfiguration;
   return text.replace(text.find(key), 1, "*");
@@ -100,67 +106,121 @@ struct Fails {
   std::map<std::string, std::string> tools = ::tools(console("asfs"));
   std::map<std::string, std::string> files = ::files();
   Asked asked = {};
+  std::vector<std::string> errors = {};  ///< traced behind the message id
 };
 
 // clang-format off
 const Fails kFailures[] = {
     {.situation = "no configuration file for the instance as it is, nor in lower case", .retval = 1020,
-     .parameter = "~/config/um_inst9.config,inst9", .asked = {.target = "Inst9:node7:DA"}},
+     .parameter = "~/config/um_inst9.config,inst9", .asked = {.target = "Inst9:node7:DA"},
+     .errors = {"Configuration file [~/config/um_inst9.config] for instance (optional) [inst9] does not exist"}},
     {.situation = "no configuration file without an instance", .retval = 1020,
-     .parameter = "~/config/um.config,", .asked = {.target = "node7:DA"}},
+     .parameter = "~/config/um.config,", .asked = {.target = "node7:DA"},
+     .errors = {"Configuration file [~/config/um.config] for instance (optional) [] does not exist"}},
     {.situation = "no model directory", .retval = 1011, .parameter = "KUMP_META_PATH,~/config/um_inst1.config",
-     .files = configuredBy(withoutKey("KUMP_META_PATH"))},
+     .files = configuredBy(withoutKey("KUMP_META_PATH")),
+     .errors = {"No value found for [KUMP_META_PATH] in config file [~/config/um_inst1.config]"}},
     {.situation = "no work directory", .retval = 1012, .parameter = "KUM_WORK_PATH,~/config/um_inst1.config",
-     .files = configuredBy(withoutKey("KUM_WORK_PATH"))},
+     .files = configuredBy(withoutKey("KUM_WORK_PATH")),
+     .errors = {"No value found for [KUM_WORK_PATH] in config file [~/config/um_inst1.config]"}},
     {.situation = "no resource directory", .retval = 1013, .parameter = "KUMP_RB_PATH,~/config/um_inst1.config",
-     .files = configuredBy(withoutKey("KUMP_RB_PATH"))},
+     .files = configuredBy(withoutKey("KUMP_RB_PATH")),
+     .errors = {"No value found for [KUMP_RB_PATH] in config file [~/config/um_inst1.config]"}},
     {.situation = "an empty configuration file", .retval = 1011, .parameter = "KUMP_META_PATH,~/config/um_inst1.config",
-     .files = configuredBy("")},
+     .files = configuredBy(""),
+     .errors = {"No value found for [KUMP_META_PATH] in config file [~/config/um_inst1.config]"}},
     {.situation = "a work directory without a separator", .retval = 1021, .parameter = "work,~/config/um_inst1.config",
-     .files = configuredBy("KUMP_META_PATH=~/meta\nKUM_WORK_PATH=work\nKUMP_RB_PATH=~/rb\n")},
+     .files = configuredBy("KUMP_META_PATH=~/meta\nKUM_WORK_PATH=work\nKUMP_RB_PATH=~/rb\n"),
+     .errors = {"Work directory [work] from tag [%] in config file [~/config/um_inst1.config] cannot be parsed, no dir separator"}},
     {.situation = "a product that is not installed", .retval = 1019, .parameter = "um", .commands = {kAskPlatforms},
-     .tools = {{"bin/qinfo", "echo 'Platform codes:'; echo 'lx8266 Product (ux)'"}}},
+     .tools = {{"bin/qinfo", "echo 'Platform codes:'; echo 'lx8266 Product (ux)'"}},
+     .errors = {"Supplied product code [um] is not installed"}},
     {.situation = "no model in the depot", .retval = 1014, .parameter = "m.mdl,~/meta", .commands = {kAskPlatforms},
-     .files = without("depot/m.mdl")},
+     .files = without("depot/m.mdl"),
+     .errors = {"Failed to copy MDL file m.mdl to MDL directory ~/meta"}},
     {.situation = "a model outside the depot", .retval = 1014, .parameter = "../depot/m.mdl,~/meta",
-     .commands = {kAskPlatforms}, .asked = {.model = "../depot/m.mdl"}},
+     .commands = {kAskPlatforms}, .asked = {.model = "../depot/m.mdl"},
+     .errors = {"Failed to copy MDL file ../depot/m.mdl to MDL directory ~/meta"}},
     {.situation = "the second script is not in the depot", .retval = 1015, .parameter = "s2.sh,~/work/scripts",
-     .commands = {kAskPlatforms}, .files = without("depot/s2.sh"), .asked = {.scripts = "s1.sh,s2.sh"}},
+     .commands = {kAskPlatforms}, .files = without("depot/s2.sh"), .asked = {.scripts = "s1.sh,s2.sh"},
+     .errors = {"Failed to copy Script file s2.sh to scripts directory ~/work/scripts"}},
     {.situation = "a script outside the depot", .retval = 1015, .parameter = "x/../../s1.sh,~/work/scripts",
-     .commands = {kAskPlatforms}, .asked = {.scripts = "x/../../s1.sh"}},
+     .commands = {kAskPlatforms}, .asked = {.scripts = "x/../../s1.sh"},
+     .errors = {"Failed to copy Script file x/../../s1.sh to scripts directory ~/work/scripts"}},
     {.situation = "no console to ask for the type", .retval = 1022, .parameter = consoleCommand("getdptype"),
-     .commands = {kAskPlatforms, consoleCommand("getdptype")}, .tools = {{"bin/qinfo", kPlatforms}}},
+     .commands = {kAskPlatforms, consoleCommand("getdptype")}, .tools = {{"bin/qinfo", kPlatforms}},
+     .errors = {"Failed to start GETDPTYPE command [" + consoleCommand("getdptype") + "]"}},
     {.situation = "a type of blanks only", .retval = 1023, .parameter = "m.mdl",
-     .commands = {kAskPlatforms, consoleCommand("getdptype")}, .tools = tools(console("  "))},
+     .commands = {kAskPlatforms, consoleCommand("getdptype")}, .tools = tools(console("  ")),
+     .errors = {"Could not get DPTYPE from metafile [m.mdl]"}},
     {.situation = "an agent that does not stop", .retval = 1027, .parameter = "inst1",
      .commands = {kAskPlatforms, consoleCommand("getdptype"), kStop},
-     .tools = tools(console("snmp"), "exit 1")},
+     .tools = tools(console("snmp"), "exit 1"),
+     .errors = {"Failed to stop agent with instance (optional) [inst1]"}},
     {.situation = "no list of start-up providers", .retval = 1028,
      .parameter = "~/config/.ConfigData/kumenv,asfs,post,SNMP",
      .commands = {kAskPlatforms, consoleCommand("getdptype"), kStop},
-     .tools = tools(console("snmp")), .files = without("config/.ConfigData/kumenv")},
+     .tools = tools(console("snmp")), .files = without("config/.ConfigData/kumenv"),
+     .errors = {"Failed to update the da config file [~/config/.ConfigData/kumenv] to have new startup parms of [asfs,post,SNMP]"}},
     {.situation = "an agent that does not start", .retval = 1026, .parameter = "inst1",
      .commands = {kAskPlatforms, consoleCommand("getdptype"), kStop, kStart},
-     .tools = tools(console("snmp"), "case \"$*\" in *start*) exit 1 ;; esac")},
+     .tools = tools(console("snmp"), "case \"$*\" in *start*) exit 1 ;; esac"),
+     .errors = {"Failed to start agent with instance (optional) [inst1]"}},
     {.situation = "a console that is gone when the old model is to go", .retval = 1017,
      .parameter = consoleCommand("DELETE"),
      .commands = {kAskPlatforms, consoleCommand("getdptype"), consoleCommand("DELETE")},
-     .tools = tools(console("asfs", "rm \"$0\""))},
+     .tools = tools(console("asfs", "rm \"$0\"")),
+     .errors = {"Failed to start DELETE command [" + consoleCommand("DELETE") + "]"}},
     {.situation = "a console that is gone when the new model is to come", .retval = 1018,
      .parameter = consoleCommand("IMPORT"),
      .commands = {kAskPlatforms, consoleCommand("getdptype"), consoleCommand("DELETE"), consoleCommand("IMPORT")},
-     .tools = tools(console("asfs", "case $command in DELETE*) rm \"$0\" ;; esac"))},
+     .tools = tools(console("asfs", "case $command in DELETE*) rm \"$0\" ;; esac")),
+     .errors = {"Failed to start IMPORT command [" + consoleCommand("IMPORT") + "]"}},
     {.situation = "a model that the agent refuses", .retval = 1016, .parameter = "m.mdl",
      .commands = {kAskPlatforms, consoleCommand("getdptype"), consoleCommand("DELETE"), consoleCommand("IMPORT")},
-     .tools = tools(console("asfs", "case $command in IMPORT*) exit 1 ;; esac"))},
+     .tools = tools(console("asfs", "case $command in IMPORT*) exit 1 ;; esac")),
+     .errors = {"Import of MDL file [m.mdl] failed"}},
+    {.situation = "a directory where the configuration file should be", .retval = 1011,
+     .parameter = "KUMP_META_PATH,~/config/um_inst1.config",
+     .files = configuredByDirectory()},
+    {.situation = "a key without a value", .retval = 1012, .parameter = "KUM_WORK_PATH,~/config/um_inst1.config",
+     .files = configuredBy("KUMP_META_PATH=~/meta\nKUM_WORK_PATH=\nKUMP_RB_PATH=~/rb\n")},
+    {.situation = "a key in lower case", .retval = 1013, .parameter = "KUMP_RB_PATH,~/config/um_inst1.config",
+     .files = configuredBy("KUMP_META_PATH=~/meta\nKUM_WORK_PATH=~/work/um\nkump_rb_path=~/rb\n")},
+    {.situation = "an inventory tool that fails", .retval = 1019, .parameter = "um", .commands = {kAskPlatforms},
+     .tools = {{"bin/qinfo", std::string(kPlatforms) + "; exit 1"}},
+     .errors = {"Supplied product code [um] is not installed"}},
+    {.situation = "the depot's parent as the model", .retval = 1014, .parameter = "..,~/meta",
+     .commands = {kAskPlatforms}, .asked = {.model = ".."}},
+    {.situation = "a model whose name climbs in the middle", .retval = 1014, .parameter = "a/../../x,~/meta",
+     .commands = {kAskPlatforms}, .asked = {.model = "a/../../x"}},
+    {.situation = "a directory as the model", .retval = 1014, .parameter = "um,~/meta", .commands = {kAskPlatforms},
+     .files = files({{"depot/um/file", ""}}), .asked = {.model = "um"}},
+    {.situation = "no directory for models", .retval = 1014, .parameter = "m.mdl,~/meta", .commands = {kAskPlatforms},
+     .files = without("meta/.keep")},
+    {.situation = "no directory for scripts", .retval = 1015, .parameter = "s1.sh,~/work/scripts",
+     .commands = {kAskPlatforms}, .files = without("work/scripts/.keep"), .asked = {.scripts = "s1.sh"}},
+    {.situation = "the depot itself as the script", .retval = 1015, .parameter = "..,~/work/scripts",
+     .commands = {kAskPlatforms}, .asked = {.scripts = "s1.sh,.."}},
+    {.situation = "a console that prints its type as an error", .retval = 1023, .parameter = "m.mdl",
+     .commands = {kAskPlatforms, consoleCommand("getdptype")}, .tools = tools(console("", "echo asfs >&2; exit 1"))},
+    {.situation = "a control script that cannot be run", .retval = 1027, .parameter = "inst1",
+     .commands = {kAskPlatforms, consoleCommand("getdptype"), kStop},
+     .tools = {{"bin/qinfo", kPlatforms}, {"bin/um_console", console("snmp")}}},
+    {.situation = "an empty list of start-up providers", .retval = 1028,
+     .parameter = "~/config/.ConfigData/kumenv,asfs,post,SNMP",
+     .commands = {kAskPlatforms, consoleCommand("getdptype"), kStop}, .tools = tools(console("snmp")),
+     .files = files({{"config/.ConfigData/kumenv", ""}})},
 };
 
 std::vector<DeploymentCase> failures() {
   std::vector<DeploymentCase> cases;
   for (const Fails& f : kFailures) {
+    const std::string id = "VMQ" + std::to_string(f.retval) + "E";
     cases.push_back({.situation = f.situation, .request = setting(f.asked), .tools = f.tools, .files = f.files,
                      .commands = f.commands, .answer = accepted(f.asked),
-                     .events = {ended(f.asked, f.retval, "VMQ" + std::to_string(f.retval) + "E", f.parameter)}});
+                     .events = {ended(f.asked, f.retval, id, f.parameter)}});
+    for (const std::string& error : f.errors) cases.back().errors.push_back(id + " " + error);
   }
   return cases;
 }
@@ -194,10 +254,46 @@ const DeploymentCase kSuccesses[] = {
     succeeds("an instance in another case than its configuration file", {.target = "INST1:node7:DA"}, kReplaced,
              console("asfs"), {{"meta/m.mdl", "model\n"}}),
     succeeds("a product code in capitals", {.product = "UM"}, kReplaced, console("asfs"), {{"meta/m.mdl", "model\n"}}),
+    succeeds("a list of nothing but commas is no list", {.model = "", .scripts = ",,"}, {kAskPlatforms}, console("asfs"), {}),
+    succeeds("empty names between scripts do not count", {.model = "", .scripts = ",s1.sh,,s2.sh,"}, {kAskPlatforms},
+             console("asfs"), {{"work/scripts/s1.sh", "one\n"}, {"work/scripts/s2.sh", "two\n"}}),
+    succeeds("a type that is part of another in the list", {}, kReplaced, console("os"), {{"config/.ConfigData/kumenv", kStartup}}),
     succeeds("the console's surroundings", {.context = " port=1920,restart=y "}, kReplaced,
              console("asfs", "env | grep -e ^KUM | sort > ~/surroundings"),
              {{"surroundings", "KUMP_DPCONSOLE_NOCONFIRM=Y\nKUMP_DPCONSOLE_PORT=1920\nKUMP_RB_PATH=~/rb\n"
                                "KUM_DP_HOSTNAME=node7\nKUM_PRODSPEC_PATH=~/meta/\n"}}),
+};
+
+DeploymentCase configured(DeploymentCase deployment, const std::string& configuration) {
+  deployment.files["config/um_inst1.config"] = configuration;
+  return deployment;
+}
+
+DeploymentCase withFile(DeploymentCase deployment, const std::string& name, const std::string& text) {
+  deployment.files[name] = text;
+  return deployment;
+}
+
+const DeploymentCase kOddMachines[] = {
+    configured(succeeds("a configuration file with lines of another system", {}, kReplaced, console("asfs"),
+                        {{"meta/m.mdl", "model\n"}}),
+               "\r\nKUMP_META_PATH='~/meta'\r\n\r\nKUM_WORK_PATH=~/work/um\r\nKUMP_RB_PATH=~/rb\r\nKUMA_STARTUP_DP=asfs\r\n"),
+    configured(succeeds("a configuration file with a key twice: the later one counts", {}, kReplaced, console("asfs"),
+                        {{"meta/m.mdl", "model\n"}}),
+               "KUMP_META_PATH=/nowhere\n" + std::string(kConfiguration)),
+    configured(succeeds("an agent that starts with no provider yet", {}, kReplacedAfterRestart, console("snmp"),
+                        {{"config/.ConfigData/kumenv", "ux|DATAPROVIDER|none|\n\ninst1|DATAPROVIDER|,SNMP|\nlast\n"}}),
+               "KUMP_META_PATH=~/meta\nKUM_WORK_PATH=~/work/um\nKUMP_RB_PATH=~/rb\n"),
+    withFile(withFile(succeeds("an agent without an instance is listed by its architecture", {.target = "node7:DA"},
+                               {kAskPlatforms, consoleCommand("getdptype"), "~/bin/CorvelAgent  -h ~ -c stop um",
+                                "~/bin/CorvelAgent  -h ~ start um", consoleCommand("DELETE"), consoleCommand("IMPORT")},
+                               console("snmp"),
+                               {{"config/.ConfigData/kumenv", "lx8266|DATAPROVIDER|asfs,post,SNMP|\n"}}),
+                      "config/um.config", kConfiguration),
+             "config/.ConfigData/kumenv", "lx8266|DATAPROVIDER|asfs,post|\n"),
+    withFile(succeeds("a list of start-up providers without the agent stays as it is", {}, kReplacedAfterRestart,
+                      console("snmp"), {{"config/.ConfigData/kumenv", "ux|DATAPROVIDER|none|\n"}}),
+             "config/.ConfigData/kumenv", "ux|DATAPROVIDER|none|\n"),
 };
 // clang-format on
 
@@ -209,6 +305,7 @@ TEST_P(DataAgentDeployment, IsAnsweredAndReported) {
 
 INSTANTIATE_TEST_SUITE_P(Failing, DataAgentDeployment, testing::ValuesIn(failures()));
 INSTANTIATE_TEST_SUITE_P(Succeeding, DataAgentDeployment, testing::ValuesIn(kSuccesses));
+INSTANTIATE_TEST_SUITE_P(OnOddMachines, DataAgentDeployment, testing::ValuesIn(kOddMachines));
 
 TEST_F(DataAgentDeployment, CopiedScriptsMayBeRunByOwnerAndGroup) {
   run(kSuccesses[5]);

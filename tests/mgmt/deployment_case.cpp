@@ -1,8 +1,12 @@
 #include "tests/mgmt/deployment_case.h"
 
+#include <filesystem>
+
+#include "mgmt/rows.h"
 #include "tests/support/temporary_directory.h"
 
 using testing::ElementsAre;
+using testing::IsSupersetOf;
 
 DeploymentRun::DeploymentRun() : home(runningComponent()) {}
 
@@ -18,16 +22,21 @@ void DeploymentRun::run(const DeploymentCase& deployment) {
   StatusEvents events;
 
   AnswerRow answer = deployment.answer;
-  for (std::string* text : {&answer.retmsgparm, &answer.context}) *text = atHome(*text);
+  answer.retmsgparm = atHome(answer.retmsgparm).substr(0, sizeof(vmq_kagreqt_data_t::retmsgparm));
+  answer.context = atHome(answer.context).substr(0, sizeof(vmq_kagreqt_data_t::context));
   EXPECT_THAT(ask(deployment.request), ElementsAre(answer.bytes()));
   for (StatusEvent event : deployment.events) {
-    event.retmsgparm = atHome(event.retmsgparm);
+    event.retmsgparm = atHome(event.retmsgparm).substr(0, sizeof(vmq_kagdyst_data_t::retmsgparm));
     EXPECT_EQ(events.next(), event.bytes());
   }
   std::vector<std::string> commands;
   for (const std::string& command : deployment.commands) commands.push_back(atHome(command));
   EXPECT_EQ(commandLines(trace), commands);
   for (const auto& [name, text] : deployment.leaves) EXPECT_EQ(readWholeFile(home.path() + "/" + name), atHome(text));
+  for (const std::string& name : deployment.absent) EXPECT_FALSE(std::filesystem::exists(home.path() + "/" + name));
+  std::vector<std::string> errors;
+  for (const std::string& error : deployment.errors) errors.push_back(atHome(error));
+  EXPECT_THAT(trace.texts(RAS1_ERROR), IsSupersetOf(errors));
   expectNothingMore(events);
 }
 

@@ -1,6 +1,7 @@
 #pragma once
 // A whole request as a case: what is asked, what the machine holds, what is run and what comes back. In every text "~"
-// stands for the installation home.
+// stands for the installation home. Expected context and message parameter may be longer than their columns, which hold
+// their beginning.
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -23,6 +24,8 @@ struct DeploymentCase {
   AnswerRow answer = {};
   std::vector<StatusEvent> events = {};
   std::map<std::string, std::string> leaves = {};  ///< files afterwards: path in the home, text
+  std::vector<std::string> absent = {};            ///< paths in the home where nothing may be afterwards
+  std::vector<std::string> errors = {};            ///< among the lines traced at the error level
 };
 
 inline std::ostream& operator<<(std::ostream& out, const DeploymentCase& deployment) {

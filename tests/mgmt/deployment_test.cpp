@@ -15,6 +15,7 @@
 namespace {
 
 using testing::ElementsAre;
+using testing::IsSupersetOf;
 
 struct Deployment {
   const char* situation;
@@ -26,6 +27,7 @@ struct Deployment {
   std::vector<std::string> commands = {};
   AnswerRow answer;
   std::optional<StatusEvent> event = std::nullopt;
+  std::vector<std::string> errors = {};  ///< among the lines traced at the error level
 };
 
 std::ostream& operator<<(std::ostream& out, const Deployment& deployment) {
@@ -45,33 +47,41 @@ const Deployment kDeployments[] = {
     // ---- refused before anything is done ----------------------------------------------------------------------------
     {.situation = "no command",
      .request = {equal("TRANSID", "t1")},
-     .answer = {.originnode = kNode, .transid = "t1", .retval = 1001, .retmsgid = "VMQ1001E"}},
+     .answer = {.originnode = kNode, .transid = "t1", .retval = 1001, .retmsgid = "VMQ1001E"},
+     .errors = {"VMQ1001E No [COMMAND] specified, it is a required parameter"}},
     {.situation = "no transaction id",
      .request = {equal("COMMAND", "START"), equal("PRODUCT", "ux")},
-     .answer = {.originnode = kNode, .command = "START", .product = "ux", .retval = 1002, .retmsgid = "VMQ1002E"}},
+     .answer = {.originnode = kNode, .command = "START", .product = "ux", .retval = 1002, .retmsgid = "VMQ1002E"},
+     .errors = {"VMQ1002E No [TRANSID] specified, it is a required parameter"}},
     {.situation = "no product",
      .request = asked("START"),
-     .answer = {.originnode = kNode, .transid = "t1", .command = "START", .retval = 1003, .retmsgid = "VMQ1003E"}},
+     .answer = {.originnode = kNode, .transid = "t1", .command = "START", .retval = 1003, .retmsgid = "VMQ1003E"},
+     .errors = {"VMQ1003E No [PRODUCT] specified, it is a required parameter"}},
     {.situation = "no context",
      .request = asked("SETCONFIG", {equal("PRODUCT", "ux")}),
      .answer = {.originnode = kNode, .transid = "t1", .command = "SETCONFIG", .product = "ux", .retval = 1004,
-                .retmsgid = "VMQ1004E"}},
+                .retmsgid = "VMQ1004E"},
+     .errors = {"VMQ1004E No [CONTEXT] specified, it is a required parameter"}},
     {.situation = "no target",
      .request = asked("REMOVEINSTANCE", {equal("PRODUCT", "ux")}),
      .answer = {.originnode = kNode, .transid = "t1", .command = "REMOVEINSTANCE", .product = "ux", .retval = 1005,
-                .retmsgid = "VMQ1005E"}},
+                .retmsgid = "VMQ1005E"},
+     .errors = {"VMQ1005E No [TARGETMSN] specified, it is a required parameter"}},
     {.situation = "unknown command",
      .request = asked("start", {equal("PRODUCT", "ux")}),
      .answer = {.originnode = kNode, .transid = "t1", .command = "start", .product = "ux", .retval = 1006,
-                .retmsgid = "VMQ1006E", .retmsgparm = "start"}},
+                .retmsgid = "VMQ1006E", .retmsgparm = "start"},
+     .errors = {"VMQ1006E Command [start] is not a supported command"}},
     {.situation = "remove instance of the data agent",
      .request = asked("REMOVEINSTANCE", {equal("PRODUCT", "Um"), equal("TARGETMSN", "inst1:node7:DA")}),
      .answer = {.originnode = kNode, .transid = "t1", .command = "REMOVEINSTANCE", .product = "Um", .retval = 1006,
-                .retmsgid = "VMQ1006E", .retmsgparm = "REMOVEINSTANCE", .targetmsn = "inst1:node7:DA"}},
+                .retmsgid = "VMQ1006E", .retmsgparm = "REMOVEINSTANCE", .targetmsn = "inst1:node7:DA"},
+     .errors = {"VMQ1006E Command [REMOVEINSTANCE] is not a supported command for DA"}},
     {.situation = "no version",
      .request = asked("INSTALL", {equal("PRODUCT", "ux"), equal("CONTEXT", "./install.sh")}),
      .answer = {.originnode = kNode, .transid = "t1", .command = "INSTALL", .product = "ux", .context = "./install.sh",
-                .retval = 1029, .retmsgid = "VMQ1029E"}},
+                .retval = 1029, .retmsgid = "VMQ1029E"},
+     .errors = {"VMQ1029E No [VERSION] specified, it is a required parameter"}},
 
     // ---- start, stop, restart ---------------------------------------------------------------------------------------
     {.situation = "start",
@@ -105,21 +115,24 @@ const Deployment kDeployments[] = {
      .commands = {"~/bin/CorvelAgent  -h ~ start ux"},
      .answer = {.originnode = kNode, .transid = "t1", .command = "START", .product = "ux"},
      .event = StatusEvent{.originnode = kNode, .transid = "t1", .command = "START", .retval = 1025,
-                          .retmsgid = "VMQ1025E", .retmsgparm = "~/bin/CorvelAgent  -h ~ start ux"}},
+                          .retmsgid = "VMQ1025E", .retmsgparm = "~/bin/CorvelAgent  -h ~ start ux"},
+     .errors = {"VMQ1025E Failed to start command [~/bin/CorvelAgent  -h ~ start ux]"}},
     {.situation = "stop that fails",
      .request = asked("STOP", {equal("PRODUCT", "ux")}),
      .control_script = "exit 1",
      .commands = {"~/bin/CorvelAgent  -h ~ -c stop ux"},
      .answer = {.originnode = kNode, .transid = "t1", .command = "STOP", .product = "ux"},
      .event = StatusEvent{.originnode = kNode, .transid = "t1", .command = "STOP", .retval = 1024,
-                          .retmsgid = "VMQ1024E", .retmsgparm = "~/bin/CorvelAgent  -h ~ -c stop ux"}},
+                          .retmsgid = "VMQ1024E", .retmsgparm = "~/bin/CorvelAgent  -h ~ -c stop ux"},
+     .errors = {"VMQ1024E Bad return code from start/stop command [~/bin/CorvelAgent  -h ~ -c stop ux]"}},
     {.situation = "restart whose stop fails keeps the message of the stop",
      .request = asked("RESTART", {equal("PRODUCT", "ux")}),
      .control_script = "case \"$*\" in *stop*) exit 1;; esac",
      .commands = {"~/bin/CorvelAgent  -h ~ -c stop ux", "~/bin/CorvelAgent  -h ~ start ux"},
      .answer = {.originnode = kNode, .transid = "t1", .command = "RESTART", .product = "ux"},
      .event = StatusEvent{.originnode = kNode, .transid = "t1", .command = "RESTART", .retval = 0,
-                          .retmsgid = "VMQ1024E", .retmsgparm = "~/bin/CorvelAgent  -h ~ -c stop ux"}},
+                          .retmsgid = "VMQ1024E", .retmsgparm = "~/bin/CorvelAgent  -h ~ -c stop ux"},
+     .errors = {"VMQ1024E Bad return code from start/stop command [~/bin/CorvelAgent  -h ~ -c stop ux]"}},
     {.situation = "start as a user who is not there",
      .request = asked("START", {equal("PRODUCT", "ux"), equal("OPTIONAL", "INSTANCE"), equal("TARGETMSN", "inst1")}),
      .control_script = "exit 0",
@@ -130,7 +143,8 @@ const Deployment kDeployments[] = {
      .event = StatusEvent{.originnode = kNode, .transid = "t1", .command = "START", .retval = 1024,
                           .retmsgid = "VMQ1024E",
                           .retmsgparm = "/usr/bin/su - vmq-no-such-user -c \"~/bin/CorvelAgent  -h ~ -o inst1 start ux\"",
-                          .targetmsn = "inst1"}},
+                          .targetmsn = "inst1"},
+     .errors = {"VMQ1024E Bad return code from start/stop command [/usr/bin/su - vmq-no-such-user -c \"~/bin/CorvelAgent  -h ~ -o inst1 start ux\"]"}},
     {.situation = "run-as file without the product",
      .request = asked("START", {equal("PRODUCT", "ux")}),
      .control_script = "exit 0",
@@ -183,6 +197,9 @@ TEST_P(WholeRequest, IsAnsweredAndReported) {
   std::vector<std::string> expected_commands;
   for (const std::string& command : c.commands) expected_commands.push_back(atHome(command));
   EXPECT_EQ(commandLines(trace), expected_commands);
+  std::vector<std::string> expected_errors;
+  for (const std::string& error : c.errors) expected_errors.push_back(atHome(error));
+  EXPECT_THAT(trace.texts(RAS1_ERROR), IsSupersetOf(expected_errors));
 
   // Nothing more was on its way: the next event is that of the next request.
   home.runAsFile("");
