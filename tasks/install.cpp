@@ -135,7 +135,9 @@ void setupForRestart(String& installCommand, String& translatorCommand, TaskQueu
     TRACE_DETAIL(trace, "Constructing install and two-way script %s", script.c_str().get());
     TRACE_DETAIL(trace, "Two Way Translator is: %s", translatorCommand.c_str().get());
   }
-  (void)writeFile(script, restartScript(depotDir, lowerCased(request.product), translatorCommand));  // traced there
+  if (writeFile(script, restartScript(depotDir, lowerCased(request.product), translatorCommand))) return;
+  // What a full file system took of it must not run: an empty script succeeds, and half a line removes half a path.
+  (void)deleteFile(script);
 }
 
 TASK_RC completeInstallAfterRestart(TaskQueueElem& request) {

@@ -15,7 +15,7 @@
 TASK_RC install(TaskQueueElem& request);
 
 /// Writes the script for a restart install and puts its call in front of the command. An empty translator command
-/// leaves the translator's step out. A failed write is only traced.
+/// leaves the translator's step out. A failed write is only traced and leaves no script, so that its call fails.
 void setupForRestart(VMQ::String& installCommand, VMQ::String& translatorCommand, TaskQueueElem& request);
 
 /// After 10 seconds (the installer may still be writing), reports the exit code that the script left in rc.txt. 0, or
