@@ -49,6 +49,7 @@ void OutputCollector::append(size_t byteCount) {
   *end = '\0';
   // Text ends at a NUL, so one among the output parts it into pieces; only the NUL itself is dropped.
   for (char* piece = buffer_.get(); piece < end; piece += strlen(piece) + 1) {
+    if (*piece == '\0') continue;
     TRACE_DETAIL(trace, "%s: %s", name_, piece);
     text_.append(String(piece));
   }

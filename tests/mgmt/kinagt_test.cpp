@@ -196,6 +196,79 @@ TEST_F(InventoryTable, HeaderWithoutALineEndGivesNoRows) {
   EXPECT_TRUE(trace.has(RAS1_ERROR, "No newline character '\n' found after Inventory header"));
 }
 
+TEST_F(InventoryTable, HeaderWithNothingBehindItGivesNoRows) {
+  inventory("-x", kHeader + "\n\n\r\n");
+  inventory("-d", kHeader);
+  EXPECT_THAT(ask(), IsEmpty());
+}
+
+TEST_F(InventoryTable, FirstHeaderCountsAndALaterOneIsAProduct) {
+  inventory("-x", "");
+  inventory("-d", kHeader + line(kUnix) + kHeader);
+  EXPECT_THAT(ask(), ElementsAre(row(kUnix), row({"ProdCode", "Version", "Description", "Release", "Platform"})));
+}
+
+TEST_F(InventoryTable, CommaInADescriptionMovesTheFieldsBehindIt) {
+  inventory("-x", "");
+  inventory("-d", kHeader + "\"ux\",\"Unix, and more\",\"lx8266\",\"06\",\"100\"\n" + line(kLibraries));
+  EXPECT_THAT(ask(), ElementsAre(row({"ux", "lx8266", "Unix", "06", " and more"}), row(kLibraries)));
+}
+
+TEST_F(InventoryTable, EmptyFieldsVanishSoThatTheirLineIsTooShort) {
+  inventory("-x", "");
+  inventory("-d", kHeader + "\"ux\",\"\",\"lx8266\",\"06\",\"100\"\n,,,,\n\"\n" + line(kLibraries));
+  EXPECT_THAT(ask(), ElementsAre(row(kLibraries)));
+  EXPECT_TRUE(trace.has(RAS1_ERROR, "Product line has 0 fields, expecting 5 fields.  Product line is: ,,,,"));
+}
+
+TEST_F(InventoryTable, LinesOfAnotherSystemAndWithoutQuotesAreRead) {
+  inventory("-x", "");
+  inventory("-d", kHeader.substr(0, kHeader.size() - 1) + "\r\nux,Unix agent,lx8266,062000000,100\r\n");
+  EXPECT_THAT(ask(), ElementsAre(row(kUnix)));
+}
+
+TEST_F(InventoryTable, ListingWithoutALineEndIsReadToItsEnd) {
+  inventory("-x", "");
+  const std::string last = line(kUnix);
+  inventory("-d", kHeader + last.substr(0, last.size() - 1));
+  EXPECT_THAT(ask(), ElementsAre(row(kUnix)));
+}
+
+TEST_F(InventoryTable, OneInventoryThatFailsLeavesTheOther) {
+  home.file("listing-x", kHeader + line(kLibraries));
+  home.tool("bin/qinfo", "cat '" + home.path() + "/listing'$1");  // there is no listing-d, so it fails
+  EXPECT_THAT(ask(), ElementsAre(row(kLibraries)));
+}
+
+TEST_F(InventoryTable, ToolThatPrintsManyZeroBytesIsReadWithoutATraceLineForEach) {
+  home.file("listing", kHeader + line(kUnix));
+  home.tool("bin/qinfo", "head -c 1048576 /dev/zero >&2; [ $1 = -x ] || cat '" + home.path() + "/listing'");
+  EXPECT_THAT(ask(), ElementsAre(row(kUnix)));
+  EXPECT_LT(trace.lines().size(), 10000u);
+}
+
+TEST_F(InventoryTable, ToolEndedByASignalGivesNoRows) {
+  home.file("listing", kHeader + line(kUnix));
+  home.tool("bin/qinfo", "cat '" + home.path() + "/listing'; kill -9 $$");
+  EXPECT_THAT(ask(), IsEmpty());
+}
+
+TEST_F(InventoryTable, DescriptionOfBlanksOnlyIsNone) {
+  inventory("-x", "");
+  inventory("-d", kHeader + line(kUnix));
+  // The row holds the tool's description, which the predicate does not let pass; "not equal" does.
+  EXPECT_THAT(ask({{"PRODDESC", INTF_NE, "   "}}), ElementsAre(row(kUnix)));
+}
+
+TEST_F(InventoryTable, RunningInAnyOtherCaseAsksForBoth) {
+  inventory("-r", "");
+  inventory("-x", "");
+  inventory("-d", kHeader + line(kUnix));
+  Product asked = kUnix;
+  asked.description = "running";
+  EXPECT_THAT(ask({equal("PRODDESC", "running")}), ElementsAre(row(asked)));
+}
+
 TEST_F(InventoryTable, LongValuesAreCutAtTheirColumns) {
   inventory("-x", kHeader);
   Product longer = kUnix;
