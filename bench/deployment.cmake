@@ -1,0 +1,1 @@
+vmq_bench(deployment_bench SOURCES deployment_bench.cpp)
