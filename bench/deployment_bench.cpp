@@ -245,8 +245,7 @@ void RequestsThatDoNothing(benchmark::State& state) {
         (void)request->sample();
         (void)answers.take(std::chrono::milliseconds(0));
       }
-      for (int64_t i = 0; i < count; ++i)
-        lost |= events.take(std::chrono::seconds(10)).kind != RowBuffer::Item::kRow;
+      for (int64_t i = 0; i < count; ++i) lost |= events.take(std::chrono::seconds(10)).kind != RowBuffer::Item::kRow;
     }));
     state.SetIterationTime(queued.back());
     if (lost) return state.SkipWithError("events are missing");

@@ -131,7 +131,8 @@ const Fails kFailures[] = {
      .errors = {"No value found for [KUMP_META_PATH] in config file [~/config/um_inst1.config]"}},
     {.situation = "a work directory without a separator", .retval = 1021, .parameter = "work,~/config/um_inst1.config",
      .files = configuredBy("KUMP_META_PATH=~/meta\nKUM_WORK_PATH=work\nKUMP_RB_PATH=~/rb\n"),
-     .errors = {"Work directory [work] from tag [%] in config file [~/config/um_inst1.config] cannot be parsed, no dir separator"}},
+     .errors = {"Work directory [work] from tag [%] "
+                "in config file [~/config/um_inst1.config] cannot be parsed, no dir separator"}},
     {.situation = "a product that is not installed", .retval = 1019, .parameter = "um", .commands = {kAskPlatforms},
      .tools = {{"bin/qinfo", "echo 'Platform codes:'; echo 'lx8266 Product (ux)'"}},
      .errors = {"Supplied product code [um] is not installed"}},
@@ -161,7 +162,8 @@ const Fails kFailures[] = {
      .parameter = "~/config/.ConfigData/kumenv,asfs,post,SNMP",
      .commands = {kAskPlatforms, consoleCommand("getdptype"), kStop},
      .tools = tools(console("snmp")), .files = without("config/.ConfigData/kumenv"),
-     .errors = {"Failed to update the da config file [~/config/.ConfigData/kumenv] to have new startup parms of [asfs,post,SNMP]"}},
+     .errors = {"Failed to update the da config file [~/config/.ConfigData/kumenv] "
+                "to have new startup parms of [asfs,post,SNMP]"}},
     {.situation = "an agent that does not start", .retval = 1026, .parameter = "inst1",
      .commands = {kAskPlatforms, consoleCommand("getdptype"), kStop, kStart},
      .tools = tools(console("snmp"), "case \"$*\" in *start*) exit 1 ;; esac"),
@@ -254,10 +256,12 @@ const DeploymentCase kSuccesses[] = {
     succeeds("an instance in another case than its configuration file", {.target = "INST1:node7:DA"}, kReplaced,
              console("asfs"), {{"meta/m.mdl", "model\n"}}),
     succeeds("a product code in capitals", {.product = "UM"}, kReplaced, console("asfs"), {{"meta/m.mdl", "model\n"}}),
-    succeeds("a list of nothing but commas is no list", {.model = "", .scripts = ",,"}, {kAskPlatforms}, console("asfs"), {}),
+    succeeds("a list of nothing but commas is no list", {.model = "", .scripts = ",,"}, {kAskPlatforms},
+             console("asfs"), {}),
     succeeds("empty names between scripts do not count", {.model = "", .scripts = ",s1.sh,,s2.sh,"}, {kAskPlatforms},
              console("asfs"), {{"work/scripts/s1.sh", "one\n"}, {"work/scripts/s2.sh", "two\n"}}),
-    succeeds("a type that is part of another in the list", {}, kReplaced, console("os"), {{"config/.ConfigData/kumenv", kStartup}}),
+    succeeds("a type that is part of another in the list", {}, kReplaced, console("os"),
+             {{"config/.ConfigData/kumenv", kStartup}}),
     succeeds("the console's surroundings", {.context = " port=1920,restart=y "}, kReplaced,
              console("asfs", "env | grep -e ^KUM | sort > ~/surroundings"),
              {{"surroundings", "KUMP_DPCONSOLE_NOCONFIRM=Y\nKUMP_DPCONSOLE_PORT=1920\nKUMP_RB_PATH=~/rb\n"
@@ -277,7 +281,8 @@ DeploymentCase withFile(DeploymentCase deployment, const std::string& name, cons
 const DeploymentCase kOddMachines[] = {
     configured(succeeds("a configuration file with lines of another system", {}, kReplaced, console("asfs"),
                         {{"meta/m.mdl", "model\n"}}),
-               "\r\nKUMP_META_PATH='~/meta'\r\n\r\nKUM_WORK_PATH=~/work/um\r\nKUMP_RB_PATH=~/rb\r\nKUMA_STARTUP_DP=asfs\r\n"),
+               "\r\nKUMP_META_PATH='~/meta'\r\n\r\nKUM_WORK_PATH=~/work/um\r\n"
+               "KUMP_RB_PATH=~/rb\r\nKUMA_STARTUP_DP=asfs\r\n"),
     configured(succeeds("a configuration file with a key twice: the later one counts", {}, kReplaced, console("asfs"),
                         {{"meta/m.mdl", "model\n"}}),
                "KUMP_META_PATH=/nowhere\n" + std::string(kConfiguration)),

@@ -1,4 +1,5 @@
-// Requests and tools that are larger, stranger or more than usual: nothing is lost and nothing is run that was not asked.
+// Requests and tools that are larger, stranger or more than usual: nothing is lost, and nothing is run that was
+// not asked.
 
 #include <sys/stat.h>
 
@@ -16,7 +17,6 @@ namespace {
 
 using testing::ElementsAre;
 using testing::ElementsAreArray;
-
 
 constexpr char kInventory[] = R"(cat <<'END'
 "ProdCode","Description","Platform","Version","Release"
@@ -49,13 +49,16 @@ AnswerRow answerTo(const std::string& command, const std::string& context = "", 
 }
 
 StatusEvent ended(const std::string& command, int retval = 0, const std::string& parameter = "") {
-  return {.originnode = kNode, .transid = "t1", .command = command, .retval = retval,
-          .retmsgid = retval == 0 ? "" : "VMQ" + std::to_string(retval) + "E", .retmsgparm = parameter};
+  return {.originnode = kNode,
+          .transid = "t1",
+          .command = command,
+          .retval = retval,
+          .retmsgid = retval == 0 ? "" : "VMQ" + std::to_string(retval) + "E",
+          .retmsgparm = parameter};
 }
 
 // ---- much of everything --------------------------------------------------------------------------------------------
 
-// clang-format off
 const DeploymentCase kMuchOfEverything[] = {
     {.situation = "a translator that reads a long configuration gets all of it",
      .request = setting(kConfiguration),
@@ -103,15 +106,18 @@ const DeploymentCase kMuchOfEverything[] = {
      .commands = afterLookup({kGet}),
      .answer = answerTo("GETCONFIG", "INSTANCE=inst1\n" + std::string(1048576, 'e'))},
     {.situation = "an installer that prints much",
-     .request = asked("INSTALL", {equal("PRODUCT", "ux"), equal("VERSION", "06.20"), equal("CONTEXT", "|DEPOTDIR|i.sh")}),
+     .request =
+         asked("INSTALL", {equal("PRODUCT", "ux"), equal("VERSION", "06.20"), equal("CONTEXT", "|DEPOTDIR|i.sh")}),
      .tools = {{"depot/i.sh", kMuch + " >&2; " + kMuch}},
      .commands = {"~/depot/i.sh"},
-     .answer = {.originnode = kNode, .transid = "t1", .command = "INSTALL", .product = "ux", .context = "|DEPOTDIR|i.sh",
+     .answer = {.originnode = kNode,
+                .transid = "t1",
+                .command = "INSTALL",
+                .product = "ux",
+                .context = "|DEPOTDIR|i.sh",
                 .version = "06.20"},
      .events = {ended("INSTALL")}},
 };
-// clang-format on
-
 /// What the installer's exit code file may hold. "missing": nothing of that name; "directory": a directory.
 DeploymentCase completed(const char* situation, const std::string& rc_txt, const std::string& parameter = "") {
   AnswerRow row = answerTo("COMPLETE_INSTALL", "", "");
@@ -143,16 +149,22 @@ const DeploymentCase kExitCodeFiles[] = {
 
 std::vector<DeploymentCase> productsThatMustNotStandInTheScript() {
   std::vector<DeploymentCase> cases;
-  for (const char* product : {".", "..", "/", "u/x", "../ux", "u x", " ", "u\tx", "u\nx", "ux;ls", "ux&", "ux|ls", "$HOME",
-                              "`ls`", "$(ls)", "u*", "u?", "[u]", "{u,x}", "ux>f", "ux<f", "u'x", "u\"x", "u\\x", "#", "~u"}) {
+  for (const char* product :
+       {".",    "..",    "/",  "u/x", "../ux", "u x",   " ",    "u\tx", "u\nx", "ux;ls", "ux&",  "ux|ls", "$HOME",
+        "`ls`", "$(ls)", "u*", "u?",  "[u]",   "{u,x}", "ux>f", "ux<f", "u'x",  "u\"x",  "u\\x", "#",     "~u"}) {
     cases.push_back(
         {.situation = product,
-         .request = asked("INSTALL", {equal("PRODUCT", product), equal("VERSION", "1"), equal("CONTEXT", "|DEPOTDIR|i.sh"),
-                                      equal("OPTIONAL", "REQUIRES_RESTART")}),
+         .request = asked("INSTALL", {equal("PRODUCT", product), equal("VERSION", "1"),
+                                      equal("CONTEXT", "|DEPOTDIR|i.sh"), equal("OPTIONAL", "REQUIRES_RESTART")}),
          .tools = translating("exit 0"),
          .commands = afterLookup({}),
-         .answer = {.originnode = kNode, .transid = "t1", .command = "INSTALL", .product = product,
-                    .context = "|DEPOTDIR|i.sh", .optional = "REQUIRES_RESTART", .version = "1"},
+         .answer = {.originnode = kNode,
+                    .transid = "t1",
+                    .command = "INSTALL",
+                    .product = product,
+                    .context = "|DEPOTDIR|i.sh",
+                    .optional = "REQUIRES_RESTART",
+                    .version = "1"},
          .events = {ended("INSTALL", 1031, "~/depot/i.sh")},
          .absent = {"depot/runcmd.sh"}});
   }
@@ -174,8 +186,8 @@ TEST_F(DeploymentLimits, ShellCharactersReachTheControlScriptAsTheyAre) {
   StatusEvents events;
   const std::string owned = home.path() + "/owned";
   for (const std::string& product :
-       {"ux;touch " + owned, "$(touch " + owned + ")", "`touch " + owned + "`", "ux&&touch " + owned, "ux|touch " + owned,
-        "ux>" + owned, "ux\ntouch " + owned, std::string("../../*")}) {
+       {"ux;touch " + owned, "$(touch " + owned + ")", "`touch " + owned + "`", "ux&&touch " + owned,
+        "ux|touch " + owned, "ux>" + owned, "ux\ntouch " + owned, std::string("../../*")}) {
     ask({equal("COMMAND", "START"), equal("TRANSID", "t1"), equal("PRODUCT", product)});
     EXPECT_EQ(events.next(), ended("START").bytes());
     EXPECT_EQ(readWholeFile(home.path() + "/runs"), "-h " + home.path() + " start " + product + "\n");
@@ -207,10 +219,8 @@ TEST_F(DeploymentLimits, LongParametersAreWholeForTheTaskAndCutInItsRows) {
   EXPECT_THAT(ask({equal("COMMAND", "INSTALL"), equal("TRANSID", transaction), equal("PRODUCT", "ux"),
                    equal("VERSION", version), equal("CONTEXT", "|DEPLOYDIR|/i.sh"), equal("TARGETMSN", target)}),
               ElementsAre(answer.bytes()));
-  const StatusEvent event{.originnode = kNode,
-                          .transid = std::string(84, 't'),
-                          .command = "INSTALL",
-                          .targetmsn = std::string(64, 'm')};
+  const StatusEvent event{
+      .originnode = kNode, .transid = std::string(84, 't'), .command = "INSTALL", .targetmsn = std::string(64, 'm')};
   EXPECT_EQ(events.next(), event.bytes());
   EXPECT_EQ(readWholeFile(home.path() + "/ran"), "ran\n");
   EXPECT_TRUE(trace.has(RAS1_ERROR, "Result data \"" + version + "\" was truncated to \"" + std::string(12, 'v') +

@@ -144,7 +144,8 @@ const Deployment kDeployments[] = {
                           .retmsgid = "VMQ1024E",
                           .retmsgparm = "/usr/bin/su - vmq-no-such-user -c \"~/bin/CorvelAgent  -h ~ -o inst1 start ux\"",
                           .targetmsn = "inst1"},
-     .errors = {"VMQ1024E Bad return code from start/stop command [/usr/bin/su - vmq-no-such-user -c \"~/bin/CorvelAgent  -h ~ -o inst1 start ux\"]"}},
+     .errors = {"VMQ1024E Bad return code from start/stop "
+                "command [/usr/bin/su - vmq-no-such-user -c \"~/bin/CorvelAgent  -h ~ -o inst1 start ux\"]"}},
     {.situation = "run-as file without the product",
      .request = asked("START", {equal("PRODUCT", "ux")}),
      .control_script = "exit 0",

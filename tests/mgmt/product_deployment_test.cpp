@@ -87,7 +87,8 @@ const DeploymentCase kGetConfig[] = {
      .tools = translating("exit 65"),
      .commands = afterLookup({"~/zlpqor6/lx8266/bin/vmq_xa -g  -pc ux"}),
      .answer = getAnswer(1008, "VMQ1008E", "GETCONFIG,ux,65,~/zlpqor6/lx8266/bin/vmq_xa -g  -pc ux"),
-     .errors = {"VMQ1008E Received bad return code [65] from two-way translator command [~/zlpqor6/lx8266/bin/vmq_xa -g  -pc ux]"}},
+     .errors = {"VMQ1008E Received bad return code [65] from two-way translator "
+                "command [~/zlpqor6/lx8266/bin/vmq_xa -g  -pc ux]"}},
 };
 
 // ---- SETCONFIG and REMOVEINSTANCE: the translator reads CONTEXT ----------------------------------------------------
@@ -142,7 +143,8 @@ const DeploymentCase kSetConfig[] = {
      .commands = afterLookup({"~/zlpqor6/lx8266/bin/vmq_xa -p  -pc ux"}),
      .answer = setAnswer(),
      .events = {setEvent(1008, "VMQ1008E", "SETCONFIG,ux,3,~/zlpqor6/lx8266/bin/vmq_xa -p  -pc ux,no such key\n")},
-     .errors = {"VMQ1008E Received bad return code [3] from two-way translator command [~/zlpqor6/lx8266/bin/vmq_xa -p  -pc ux], STDERR=[no such key\n]"}},
+     .errors = {"VMQ1008E Received bad return code [3] from two-way translator "
+                "command [~/zlpqor6/lx8266/bin/vmq_xa -p  -pc ux], STDERR=[no such key\n]"}},
 };
 
 const DeploymentCase kRemovals[] = {
@@ -174,14 +176,16 @@ const DeploymentCase kRemovals[] = {
      .commands = afterLookup({"~/zlpqor6/lx8266/bin/vmq_xa -r inst1 -pc ux"}),
      .answer = removeAnswer(),
      .events = {removeEvent(1009, "VMQ1009E", "REMOVEINSTANCE,ux,~/zlpqor6/lx8266/bin/vmq_xa -r inst1 -pc ux")},
-     .errors = {"VMQ1009E Failed to start two way translator using command [~/zlpqor6/lx8266/bin/vmq_xa -r inst1 -pc ux]"}},
+     .errors = {"VMQ1009E Failed to start two way translator using "
+                "command [~/zlpqor6/lx8266/bin/vmq_xa -r inst1 -pc ux]"}},
     {.situation = "a translator that fails: its code in digits",
      .request = kRemoveInstance,
      .tools = translating("exit 65"),
      .commands = afterLookup({"~/zlpqor6/lx8266/bin/vmq_xa -r inst1 -pc ux"}),
      .answer = removeAnswer(),
      .events = {removeEvent(1008, "VMQ1008E", "REMOVEINSTANCE,ux,65,~/zlpqor6/lx8266/bin/vmq_xa -r inst1 -pc ux")},
-     .errors = {"VMQ1008E Received bad return code [65] from two-way translator command [~/zlpqor6/lx8266/bin/vmq_xa -r inst1 -pc ux]"}},
+     .errors = {"VMQ1008E Received bad return code [65] from two-way translator "
+                "command [~/zlpqor6/lx8266/bin/vmq_xa -r inst1 -pc ux]"}},
 };
 
 // ---- UNINSTALL -----------------------------------------------------------------------------------------------------

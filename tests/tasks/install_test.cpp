@@ -90,7 +90,8 @@ TEST_F(Installing, ScriptRemovesTheProductInLowerCase) {
 }
 
 TEST_F(Installing, PatchesOfTwoProductsKeepThePipes) {
-  for (const char* product : {"oy", "or", "OY", "Or"}) EXPECT_TRUE(keepsPipes(product, "|CORVELHOME|/qorpatch")) << product;
+  for (const char* product : {"oy", "or", "OY", "Or"})
+    EXPECT_TRUE(keepsPipes(product, "|CORVELHOME|/qorpatch")) << product;
   for (const char* product : {"ux", "o", "oyx"}) EXPECT_FALSE(keepsPipes(product, "|CORVELHOME|/qorpatch")) << product;
   EXPECT_FALSE(keepsPipes("oy", "|CORVELHOME|/install.sh"));
 }

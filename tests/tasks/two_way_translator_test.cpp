@@ -78,8 +78,8 @@ TEST_F(InstanceName, IsEmptyWhenTheTranslatorCannotBeRun) {
 TEST_F(InstanceName, IsEmptyWhenTheTranslatorFailsWhateverItPrinted) {
   translator("echo inst1; exit 65");
   EXPECT_EQ(of("m1:UX"), "");
-  EXPECT_TRUE(trace.has(RAS1_ERROR, "Received bad return code [65] from two-way translator command [" +
-                                        command("m1:UX") + "]"));
+  EXPECT_TRUE(trace.has(RAS1_ERROR,
+                        "Received bad return code [65] from two-way translator command [" + command("m1:UX") + "]"));
 }
 
 TEST_F(InstanceName, TranslatorThatWasFoundIsTraced) {
