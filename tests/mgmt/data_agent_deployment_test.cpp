@@ -348,4 +348,37 @@ TEST_F(DataAgentDeployment, TracesEachStepOfANewType) {
   }
 }
 
+TEST_F(DataAgentDeployment, TracesWhyNothingIsDone) {
+  run(kSuccesses[0]);
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "DA SetConfig called but no MDL or Script files specified"));
+}
+
+TEST_F(DataAgentDeployment, TracesWhyAServedTypeNeedsNoRestart) {
+  run(kSuccesses[2]);
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "DPtype [SOCK] is part of dptype [ASFS]"));
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "DPtype [ASFS] already in startup parms list [asfs,post]"));
+}
+
+TEST_F(DataAgentDeployment, EachTypeThatTheOneProviderServesNeedsNoRestart) {
+  for (const char* type : {"apis", "sock", "file", "scrp"}) {
+    run(succeeds(type, {}, kReplaced, console(type), {{"config/.ConfigData/kumenv", kStartup}}));
+    trace.clear();
+  }
+}
+
+TEST_F(DataAgentDeployment, TracesTheModeOfACopiedScript) {
+  run(kSuccesses[5]);
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, atHome("Settings permissions on script file [~/work/scripts/s1.sh] to [504]")));
+}
+
+TEST_F(DataAgentDeployment, TracesThatTheAgentStartsWithNoProvider) {
+  run(kOddMachines[2]);
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "No value found for KUMA_STARTUP_DP"));
+}
+
+TEST_F(DataAgentDeployment, TracesThatTheListOfStartupProvidersIsEmpty) {
+  run(withFile(failures().back(), "config/.ConfigData/kumenv", ""));
+  EXPECT_TRUE(trace.has(RAS1_ERROR, atHome("Contents of config file [~/config/.ConfigData/kumenv] was empty")));
+}
+
 }  // namespace

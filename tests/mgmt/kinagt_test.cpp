@@ -72,7 +72,13 @@ TEST_F(InventoryTable, ListsWhatIsInstalledAndWhatElseIsKnown) {
               ElementsAre("/bin/ksh -c '. " + home.path() + "/bin/dynarch.shl " + home.path() +
                               "/registry/archdsc.tbl >/dev/null 2>&1;echo ArchitectureHeader;echo $os;echo $cArch'",
                           home.path() + "/bin/qinfo -d", home.path() + "/bin/qinfo -x"));
-  EXPECT_TRUE(trace.has(RAS1_DETAIL, "$os = Linux, $cArch = lx8266"));
+  std::string product = line(kUnix);
+  product.pop_back();
+  for (const std::string& text :
+       {std::string("$os = Linux, $cArch = lx8266"), "qinfo command is: [" + home.path() + "/bin/qinfo -d]",
+        std::string("Index of inventory header is 10"), std::string("Index of newline after inventory header is : 65"),
+        "Found product line: " + product})
+    EXPECT_TRUE(trace.has(RAS1_DETAIL, text)) << text;
 }
 
 TEST_F(InventoryTable, RunningProductsAreAskedForAlone) {

@@ -38,6 +38,7 @@ TEST_F(ProductLookups, ProductIsFoundInTheInventory) {
   inventory("before\n" + kHeader + "\n" + line("ax", "lx8266") + line("ux", "lx8266"));
   EXPECT_TRUE(isProductInStandardInventory("ux"));
   EXPECT_THAT(commandLines(trace), ElementsAre(home.path() + "/bin/qinfo -d "));
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "Looking for product code ux"));
   EXPECT_TRUE(trace.has(RAS1_DETAIL, "product code [ux] found with [" + home.path() + "/bin/qinfo -d ]"));
 }
 
@@ -99,6 +100,7 @@ TEST_F(ProductLookups, HeaderWithNothingBehindItFindsNothing) {
 TEST_F(ProductLookups, FirstLineWinsWithoutAHint) {
   inventory(kHeader + "\n" + line("ux", "aix533") + line("ux", "lx8266"));
   EXPECT_EQ(sharedLibArch("ux"), "aix533");
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "Looking for product code ux"));
   EXPECT_TRUE(trace.has(RAS1_DETAIL, "Architecture for product code [ux] is [aix533]"));
 }
 
@@ -155,7 +157,10 @@ TEST_F(ProductLookups, ArchitectureOfAProductIsInThePlatformListing) {
   inventory("Platform codes:\naix533 Product (ux)\nlx8266 Product (um)\nlx6266: Product (um)\n");
   EXPECT_EQ(getProductArch("um").toNarrow(), "lx8266");
   EXPECT_THAT(commandLines(trace), ElementsAre(home.path() + "/bin/qinfo -p um"));
-  EXPECT_TRUE(trace.has(RAS1_DETAIL, "Architecture for product code [um] is [lx8266]"));
+  for (const char* text : {"Looking for product code um", "Index of inventory header is 0",
+                           "Index of newline after product header is : 15", "Found product line: lx8266 Product (um)",
+                           "Architecture for product code [um] is [lx8266]"})
+    EXPECT_TRUE(trace.has(RAS1_DETAIL, text)) << text;
 }
 
 TEST_F(ProductLookups, PlatformLinesOfAnotherFormDoNotCount) {
@@ -177,6 +182,8 @@ TEST_F(ProductLookups, PlatformHeaderWithoutALineEndFindsNothing) {
 
 TEST_F(ProductLookups, DirectoryOfAnArchitecture) {
   EXPECT_EQ(getProductArchDir("lx8266", "um").toNarrow(), home.path() + "/zlpqor6/lx8266/um");
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "Architecture directory for architecture [lx8266] product code [um] is [" +
+                                         home.path() + "/zlpqor6/lx8266/um]"));
   EXPECT_EQ(getProductArchDir("lx8266", "ax").toNarrow(), home.path() + "/zlpqor6/lx8266/bin");
   EXPECT_EQ(getProductArchDir("", "um").toNarrow(), "");
   EXPECT_EQ(getProductArchDir("lx8266", "").toNarrow(), "");
