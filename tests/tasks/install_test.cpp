@@ -93,7 +93,9 @@ TEST_F(Installing, PatchesOfTwoProductsKeepThePipes) {
   for (const char* product : {"oy", "or", "OY", "Or"})
     EXPECT_TRUE(keepsPipes(product, "|CORVELHOME|/qorpatch")) << product;
   for (const char* product : {"ux", "o", "oyx"}) EXPECT_FALSE(keepsPipes(product, "|CORVELHOME|/qorpatch")) << product;
-  EXPECT_FALSE(keepsPipes("oy", "|CORVELHOME|/install.sh"));
+  for (const char* command :
+       {"|CORVELHOME|/install.sh", "|CORVELHOME|/install.sh qorpatc", "|CORVELHOME|/install.sh QORPATCH"})
+    EXPECT_FALSE(keepsPipes("oy", command)) << command;
 }
 
 TEST_F(Installing, CompletionSleepsTenSecondsAndLeavesTheFile) {
