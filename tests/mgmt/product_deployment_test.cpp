@@ -40,8 +40,9 @@ AnswerRow answerTo(const std::string& command, const std::string& product = "ux"
 
 // ---- GETCONFIG: answered at once -----------------------------------------------------------------------------------
 
-AnswerRow getAnswer(int retval, const std::string& id, const std::string& parameter) {
+AnswerRow getAnswer(int retval, const std::string& id, const std::string& parameter, const std::string& context = "") {
   AnswerRow row = answerTo("GETCONFIG");
+  row.context = context;
   row.retval = retval;
   row.retmsgid = id;
   row.retmsgparm = parameter;
@@ -61,6 +62,11 @@ const DeploymentCase kGetConfig[] = {
      .tools = translating("echo A=1"),
      .commands = afterLookup({"~/zlpqor6/lx8266/bin/vmq_xa -g  -pc ux"}),
      .answer = answerTo("GETCONFIG")},
+    {.situation = "the first mark that is whole counts",
+     .request = kGet,
+     .tools = translating("printf 'INSTANCES=2\\ninstance=inst0\\nINSTANCE=inst1\\nINSTANCE=inst2\\n'"),
+     .commands = afterLookup({"~/zlpqor6/lx8266/bin/vmq_xa -g  -pc ux"}),
+     .answer = getAnswer(0, "", "", "INSTANCE=inst1\nINSTANCE=inst2\n")},
     {.situation = "no inventory tool, so no translator",
      .request = kGet,
      .commands = afterLookup(),
