@@ -1,7 +1,6 @@
 // vmqctl against the real daemon and a real agent.
 
 #include <csignal>
-#include <filesystem>
 
 #include "tests/e2e/deployment.h"
 #include "tests/e2e/loopback.h"
@@ -13,11 +12,6 @@ using testing::HasSubstr;
 class Client : public Deployment {
  protected:
   Client() { startDaemon(); }
-
-  /// vmqctl with these arguments, as a shell reads them.
-  Outcome vmqctl(const std::string& arguments) const {
-    return runShell("VMQ_SOCKET=" + quoted(daemon->socket()) + " " VMQ_PROGRAMS "/vmqctl " + arguments + " </dev/null");
-  }
 };
 
 TEST_F(Client, StartsRestartsAndStopsAnAgent) {
@@ -66,19 +60,6 @@ TEST_F(Client, WatchShowsTheOutcomeOfARequestThatWasNotWaitedFor) {
                                    "/vmqctl start ux --transid t1 --no-wait && wait $!");
   EXPECT_EQ(outcome.exit_code, 0) << outcome.output;
   EXPECT_THAT(outcome.output, HasSubstr("t1: START on " + std::string(DaemonFixture::node) + " done"));
-}
-
-TEST_F(Client, InstallsAVersionOfAProductAndRemovesItWithItsAgents) {
-  std::filesystem::copy(VMQ_SOURCE_DIR "/examples/bundles", daemon->depot(), std::filesystem::copy_options::recursive);
-  const Outcome installed = vmqctl("install ux --version 010100000 --command '|DEPLOYDIR|/install.sh |CORVELHOME|'");
-  EXPECT_EQ(installed.exit_code, 0) << installed.output;
-  EXPECT_THAT(vmqctl("inventory ux").output, HasSubstr("010100000"));
-  ASSERT_EQ(vmqctl("start ux").exit_code, 0);
-
-  const Outcome removed = vmqctl("uninstall ux");
-  EXPECT_EQ(removed.exit_code, 0) << removed.output;
-  EXPECT_FALSE(answers(home.port("ux")));
-  EXPECT_THAT(vmqctl("inventory ux").output, testing::Not(HasSubstr("010100000")));
 }
 
 TEST_F(Client, DaemonThatIsGoneIsNotReachable) {

@@ -17,6 +17,22 @@ void Deployment::startDaemon(const std::vector<std::string>& lines) {
   daemon = std::make_unique<DaemonFixture>(DaemonFixture::Options{.home = home.path(), .library = "", .lines = lines});
 }
 
+void Deployment::startHurriedDaemon() {
+  daemon = std::make_unique<DaemonFixture>(
+      DaemonFixture::Options{.home = home.path(), .library = VMQ_HURRIED_COMPONENT, .lines = {}});
+}
+
+Outcome Deployment::vmqctl(const std::string& arguments) const {
+  return runShell("VMQ_SOCKET=" + quoted(daemon->socket()) + " " VMQ_PROGRAMS "/vmqctl " + arguments + " </dev/null");
+}
+
+void Deployment::stageBundles() const {
+  const Outcome outcome =
+      runShell("VMQ_EXPORTER=" + quoted(VMQ_EXPORTER) + " " VMQ_SOURCE_DIR "/examples/bundles/assemble --received " +
+               quoted(daemon->depot()));
+  EXPECT_EQ(outcome.exit_code, 0) << outcome.output;
+}
+
 nlohmann::json Deployment::query(const std::string& table, const Json& predicates) {
   const HttpReply reply =
       HttpClient(daemon->socket()).post("/v1/tables/" + table + "/query", Json{{"predicates", predicates}}.dump());

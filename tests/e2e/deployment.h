@@ -31,6 +31,15 @@ class Deployment : public testing::Test {
 
   /// Starts the daemon; `lines` are further lines of its configuration file.
   void startDaemon(const std::vector<std::string>& lines = {});
+  /// Starts the daemon with a component that does not sleep: no second before an event, no ten seconds before the
+  /// outcome of an install that restarts the daemon.
+  void startHurriedDaemon();
+
+  /// vmqctl with these arguments, as a shell reads them.
+  [[nodiscard]] Outcome vmqctl(const std::string& arguments) const;
+
+  /// Lays the sample bundles into the depot as a transfer leaves them there.
+  void stageBundles() const;
 
   /// The rows of a query. Predicates go out in the order of their names.
   Json query(const std::string& table, const Json& predicates);

@@ -4,6 +4,7 @@
 #include <signal.h>
 
 #include <filesystem>
+#include <fstream>
 
 #include "tests/e2e/sample_home.h"
 
@@ -46,6 +47,14 @@ TEST_F(SampleTools, PlatformListingNamesTheArchitectureOfTheProduct) {
   EXPECT_EQ(inventory("-p zz").output, "Platform codes:\n");
 }
 
+TEST_F(SampleTools, InventoryOfOthersIsWhatRegisteredItself) {
+  EXPECT_EQ(inventory("-x").output, header);
+  const std::string line = "\"rp\",\"Report\",\"lx8266\",\"010000000\",\"100\"\n";
+  std::ofstream(home / "registry/others.tbl") << line;
+  EXPECT_EQ(inventory("-x").output, header + line);
+  EXPECT_THAT(inventory("-d").output, testing::Not(HasSubstr("rp")));
+}
+
 // As it is called when it is looked up where the libraries are.
 TEST_F(SampleTools, InventoryTakesAnEmptyLastArgument) {
   EXPECT_EQ(inventory("-d ''").output, inventory("-d").output);
@@ -76,7 +85,7 @@ TEST_F(SampleTools, UninstallKeepsAProductWhoseAgentCannotBeStopped) {
 }
 
 TEST_F(SampleTools, UninstallRefusesWhatIsNotInstalledAndWhatItDoesNotUnderstand) {
-  for (const char* arguments : {"-i ux aix433", "-i ax lx8266", "-i lz lx8266"})
+  for (const char* arguments : {"-i ux aix433", "-i ax lx8266", "-i lz lx8266", "-i ../ux lx8266", "-i '' lx8266"})
     EXPECT_EQ(runShell(quoted(home / "bin/uninstall.sh") + " " + arguments).exit_code, 1) << arguments;
   for (const char* arguments : {"", "-i ux", "-x ux lx8266", "-i ux lx8266 now"})
     EXPECT_EQ(runShell(quoted(home / "bin/uninstall.sh") + " " + arguments).exit_code, 64) << arguments;
@@ -123,7 +132,68 @@ TEST_F(SampleTools, TranslatorRefusesSettingsItDoesNotKnowAndKeepsTheOldOnes) {
     EXPECT_EQ(outcome.exit_code, 1) << text;
     EXPECT_EQ(readWholeFile(home / "config/ux_inst1.config"), before) << text;
   }
-  EXPECT_EQ(runShell("ls " + quoted(home / "config")).output, "ux.config\nux_inst1.config\n") << "work files left";
+  EXPECT_EQ(runShell("ls " + quoted(home / "config")).output, "rms.config\num.config\nux.config\nux_inst1.config\n")
+      << "work files left";
+}
+
+TEST_F(SampleTools, TranslatorRegistersAProductOnce) {
+  EXPECT_EQ(translator("-setRMS ux").output, "ux registered with server1:1918\n");
+  EXPECT_EQ(translator("-setRMS um").exit_code, 0);
+  EXPECT_EQ(translator("-setRMS ux").exit_code, 0);
+  EXPECT_EQ(readWholeFile(home / "registry/rms.tbl"), "um server1:1918\nux server1:1918\n");
+}
+
+TEST_F(SampleTools, TranslatorRegistersNothingThatIsNotInstalledAndNotWithoutAServer) {
+  EXPECT_EQ(translator("-setRMS lz").output, "vmq_xa: product \"lz\" is not installed\n");
+  EXPECT_EQ(translator("-setRMS '.*'").exit_code, 1);
+  std::ofstream(home / "config/rms.config") << "# no server\n";
+  const Outcome outcome = translator("-setRMS ux");
+  EXPECT_EQ(outcome.exit_code, 1);
+  EXPECT_EQ(outcome.output, "vmq_xa: config/rms.config names no SERVER\n");
+  EXPECT_FALSE(fs::exists(home / "registry/rms.tbl"));
+}
+
+TEST_F(SampleTools, TranslatorStopsTheInstanceThatItRemoves) {
+  ASSERT_EQ(home.control("-o inst1 start ux").exit_code, 0);
+  const pid_t agent = home.pid("ux_inst1").value();
+  EXPECT_EQ(translator("-r inst1 -pc ux").exit_code, 0);
+  EXPECT_FALSE(isRunning(agent));
+}
+
+TEST_F(SampleTools, JavaIsFoundWhereTheSearchPathLeads) {
+  fs::create_directories(home / "jdk/bin");
+  fs::create_directories(home / "links");
+  (void)home.writeProgram("jdk/bin/java", "exit 0");
+  fs::create_symlink(home / "jdk/bin/java", home / "links/java");
+  const std::string script = quoted(home / "bin/CorvelGetJavaHome");
+  const Outcome found = runShell("PATH=" + quoted(home / "links") + ":/usr/bin:/bin " + script);
+  EXPECT_EQ(found.exit_code, 0);
+  EXPECT_EQ(found.output, fs::canonical(home / "jdk").string() + "\n");
+  fs::create_directories(home / "empty");
+  const Outcome none = runShell("PATH=" + quoted(home / "empty") + " /bin/sh " + script);
+  EXPECT_EQ(none.exit_code, 1);
+  EXPECT_EQ(none.output, "CorvelGetJavaHome: there is no java in PATH\n");
+}
+
+TEST_F(SampleTools, ConsoleKnowsTheTypeOfAModel) {
+  std::ofstream(home / "load.mdl") << "* comment\r\nNAME=load\r\nTYPE=SCRP\r\n";
+  const std::string console = quoted(home / "bin/um_console") + " -h " + quoted(home.path()) + " -c ";
+  EXPECT_EQ(runShell(console + quoted("getdptype " + (home / "load.mdl"))).output, "SCRP\n");
+  EXPECT_EQ(runShell(console + quoted("getdptype " + (home / "gone.mdl"))).output,
+            "um_console: cannot read the model \"" + (home / "gone.mdl") + "\"\n");
+  EXPECT_EQ(runShell(console + "'getdptype'").exit_code, 64);
+  EXPECT_EQ(runShell(console + quoted("LIST " + (home / "load.mdl"))).exit_code, 64);
+}
+
+TEST_F(SampleTools, ConsoleNeedsTheAgentOfThisFolderAndThatItRuns) {
+  const std::string models = home / "zlpqor6/lx8266/um/metafiles";
+  std::ofstream(models + "/load.mdl") << "NAME=load\nTYPE=POST\nSCRIPT=read.sh\n";
+  const std::string console = quoted(home / "bin/um_console") + " -h " + quoted(home.path()) + " -c " +
+                              quoted("IMPORT " + models + "/load.mdl");
+  EXPECT_EQ(runShell("KUM_PRODSPEC_PATH=/elsewhere/ " + console).output,
+            "um_console: no data agent has its models in \"/elsewhere/\" (KUM_PRODSPEC_PATH)\n");
+  EXPECT_EQ(runShell("KUM_PRODSPEC_PATH=" + models + "/ " + console).output,
+            "um_console: no data agent answers on port " + std::to_string(home.port("um")) + "\n");
 }
 
 TEST_F(SampleTools, TranslatorRefusesWhatItDoesNotUnderstand) {

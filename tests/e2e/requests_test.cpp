@@ -53,7 +53,7 @@ TEST_F(Requests, QueryThatRejectsItsAnswerRunsTheCommandAllTheSame) {
 
 TEST_F(Requests, InventoryListsWhatIsInstalledAndWhatRuns) {
   const Json rows = query("KINAGT", Json::object());
-  ASSERT_EQ(rows.size(), 2U);
+  ASSERT_EQ(rows.size(), 3U);
   EXPECT_EQ(rows[0]["PRODUCT"], "ux");
   EXPECT_EQ(rows[0]["PRODDESC"], "Unix host agent");
   EXPECT_EQ(rows[0]["PLATFORM"], "lx8266");
@@ -61,7 +61,8 @@ TEST_F(Requests, InventoryListsWhatIsInstalledAndWhatRuns) {
   EXPECT_EQ(rows[0]["RELEASE"], "100");
   EXPECT_EQ(rows[0]["CORVELHOME"], home.path());
   EXPECT_EQ(rows[0]["HOSTTYPE"], "Linux");
-  EXPECT_EQ(rows[1]["PRODUCT"], "ax");
+  EXPECT_EQ(rows[1]["PRODUCT"], "um");
+  EXPECT_EQ(rows[2]["PRODUCT"], "ax");
 
   EXPECT_EQ(query("KINAGT", {{"PRODDESC", "RUNNING"}}), Json::array());
   ASSERT_THAT(carryOut({{"COMMAND", "START"}, {"TRANSID", "t1"}, {"PRODUCT", "ux"}}), Succeeded());

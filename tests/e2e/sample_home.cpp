@@ -35,7 +35,8 @@ SampleHome::SampleHome() {
   // By a name in this home, so that the command line of each agent tells whose it is.
   const std::string program = *this / "prometheus-node-exporter";
   fs::create_symlink(VMQ_EXPORTER, program);
-  for (const char* agent : {"ux", "ux_inst1"}) {
+  EXPECT_EQ(runShell("sed -i 's|/opt/vmq-home|" + path() + "|' " + quoted(*this / "config/um.config")).exit_code, 0);
+  for (const char* agent : {"ux", "ux_inst1", "um"}) {
     configure(agent, "PROGRAM=" + program);
     configure(agent, "PORT=" + std::to_string(freePort()));
   }

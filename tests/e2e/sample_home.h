@@ -13,7 +13,7 @@
 
 /// Ends every process whose command line names this copy when it goes; there are none but those that its tools started.
 /// Fails the running test when there is no agent program to start.
-/// An agent is named like its files: "ux", "ux_inst1".
+/// An agent is named like its files: "ux", "ux_inst1", "um".
 class SampleHome {
  public:
   SampleHome();

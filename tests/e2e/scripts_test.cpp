@@ -12,12 +12,14 @@ namespace fs = std::filesystem;
 
 TEST(Scripts, EachOneIsWellFormedShellAndRunsFromAnywhere) {
   unsigned seen = 0;
-  for (const char* folder :
-       {"scripts", ".ci", "examples/home/bin", "examples/home/zlpqor6/lx8266/bin", "examples/bundles/ux/010100000"}) {
+  for (const char* folder : {"scripts", ".ci", "examples/home/bin", "examples/home/zlpqor6/lx8266/bin",
+                             "examples/bundles", "examples/bundles/ux/010100000", "examples/bundles/um"}) {
     for (const auto& entry : fs::directory_iterator(fs::path(VMQ_SOURCE_DIR) / folder)) {
       const std::string script = entry.path();
+      if (entry.is_directory() || script.ends_with(".md") || script.ends_with(".txt") || script.ends_with(".mdl"))
+        continue;
       const bool is_sourced = script.ends_with("packages.sh") || script.ends_with(".shl");
-      EXPECT_EQ(runShell("/bin/sh -n " + quoted(script)).output, "") << script;
+      EXPECT_EQ(runShell("tr -d '\\r' <" + quoted(script) + " | /bin/sh -n").output, "") << script;
       EXPECT_EQ(fs::status(script).permissions() & fs::perms::owner_exec,
                 is_sourced ? fs::perms::none : fs::perms::owner_exec)
           << script;

@@ -1,9 +1,10 @@
 #!/bin/sh
 # Removes a product from this installation:
 #
-#   uninstall.sh -i PRODUCT ARCHITECTURE
+#   uninstall.sh -i PRODUCT PLATFORM
 #
-# Its agents are stopped first; while one of them cannot be, nothing is removed. Configuration and logs stay.
+# Its agents are stopped first; while one of them cannot be, nothing is removed. Then goes what the product has in
+# zlpqor6/PLATFORM/PRODUCT, and its line in the inventory. Configuration and logs stay.
 # Exit status: 0 removed; 1 failed; 64 command line not understood.
 set -u
 
@@ -16,10 +17,11 @@ fail() {
 }
 
 if [ $# -ne 3 ] || [ "$1" != -i ]; then
-  echo "usage: uninstall.sh -i PRODUCT ARCHITECTURE" >&2
+  echo "usage: uninstall.sh -i PRODUCT PLATFORM" >&2
   exit 64
 fi
-[ "$2" = ux ] || fail "product \"$2\" cannot be removed; there is ux"
+case $2$3 in *[!A-Za-z0-9]*) fail "\"$2\" for \"$3\" is not the name of a product and a platform" ;; esac
+[ "$2" != ax ] || fail "product \"ax\" cannot be removed: the others need it"
 
 others=$(grep -v "^\"$2\",\"[^\"]*\",\"$3\"," "$products")
 [ "$others" != "$(cat "$products")" ] || fail "product \"$2\" is not installed for $3"
@@ -31,6 +33,7 @@ for config in "$home/config/$2.config" "$home/config/$2"_*.config; do
   "$home/bin/CorvelAgent" -h "$home" -c ${instance:+-o "${instance#_}"} stop "$2" || fail "$2 is still running"
 done
 
+rm -rf "$home/zlpqor6/$3/$2" || fail "cannot remove $home/zlpqor6/$3/$2"
 echo "$others" >"$products.new" || fail "cannot write in $home/registry"
 mv "$products.new" "$products" || fail "cannot write $products"
 echo "$2 removed"

@@ -1,20 +1,58 @@
 #!/bin/sh
-# Installs version 010100000 of the product ux:
+# Installs the Unix host agent, or removes it:
 #
-#   install.sh HOME
+#   install.sh HOME RESPONSES
 #
-# There is no program to bring along, since the agent is Debian's: what is installed is the entry in the inventory.
-# Exit status: 0 installed; 1 failed; 64 command line not understood.
+# RESPONSES is a file of lines KEY=value: ACTION, install or uninstall; PORT, where the agent is to answer when it has no
+# configuration yet. The version is the name of this folder. Agents that run go on as they are until they are restarted.
+# Exit status: 0 done; 1 failed; 64 command line not understood.
 set -u
 
+fail() {
+  echo "install.sh: $*" >&2
+  exit 1
+}
+
+# response KEY: its value. Response files keep the line ends that they were sent with.
+response() {
+  sed -n "s/^$1=//p" "$responses" | tail -n 1 | tr -d '\r'
+}
+
+here=$(cd "$(dirname "$0")" && pwd)
 home=${1-}
-if [ $# -ne 1 ] || [ ! -d "$home/registry" ]; then
-  echo "usage: install.sh HOME" >&2
+responses=${2-}
+if [ $# -ne 2 ] || [ ! -d "$home/registry" ] || [ ! -r "$responses" ]; then
+  echo "usage: install.sh HOME RESPONSES" >&2
   exit 64
 fi
+case $(response ACTION) in
+  install) ;;
+  uninstall) exec "$here/uninstall.sh" "$home" ;;
+  *) fail "ACTION in $responses is neither install nor uninstall" ;;
+esac
+
+version=$(basename "$here")
 products=$home/registry/products.tbl
+platform=$(sed -n 's/^"ax","[^"]*","\([^"]*\)".*/\1/p' "$products" | head -n 1)
+[ -n "$platform" ] || fail "$products lists no product ax, so the platform is not known"
+
+# The program first, under another name until it is whole: an agent may be running from the old one.
+program=$home/zlpqor6/$platform/ux/bin/prometheus-node-exporter
+mkdir -p "${program%/*}" || fail "cannot write in $home/zlpqor6"
+cp "$here/prometheus-node-exporter" "$program.new" || fail "cannot copy the program"
+chmod 755 "$program.new"
+mv "$program.new" "$program" || fail "cannot write $program"
+
+[ -e "$home/config/ux.config" ] || echo "PORT=$(response PORT)" >"$home/config/ux.config"
+for config in "$home"/config/ux.config "$home"/config/ux_*.config; do
+  [ -e "$config" ] || continue
+  { sed '/^PROGRAM=/d' "$config" && echo "PROGRAM=$program"; } >"$config.new" || fail "cannot write in $home/config"
+  mv "$config.new" "$config" || fail "cannot write $config"
+done
 
 {
-  echo '"ux","Unix host agent","lx8266","010100000","100"'
+  echo "\"ux\",\"Unix host agent\",\"$platform\",\"$version\",\"100\""
   grep -v '^"ux",' "$products"
-} >"$products.new" && mv "$products.new" "$products"
+} >"$products.new"
+mv "$products.new" "$products" || fail "cannot write $products"
+echo "ux $version installed for $platform"
