@@ -89,6 +89,15 @@ TEST_F(DataAgent, ModelWhoseScriptIsMissingIsNotImported) {
   EXPECT_THAT(daemon->log(), HasSubstr("um_console: there is no script " + folder("scripts/read_load.sh")));
 }
 
+// The old model is deleted before the new one is imported.
+TEST_F(DataAgent, ModelThatCannotBeImportedAgainIsNotShownAnyMore) {
+  ASSERT_EQ(vmqctl("set-da-config --model load.mdl --script read_load.sh").exit_code, 0);
+  ASSERT_THAT(shown(), HasSubstr("\nsample_load{"));
+  fs::remove(folder("scripts/read_load.sh"));
+  EXPECT_EQ(vmqctl("set-da-config --model load.mdl").exit_code, 1);
+  EXPECT_THAT(shown(), AllOf(HasSubstr("\nnode_"), Not(HasSubstr("sample_load"))));
+}
+
 TEST_F(DataAgent, WhatIsMissingIsNamed) {
   const struct {
     const char* typed;

@@ -156,7 +156,7 @@ TEST_F(Products, ConfigurationThatTheTranslatorRefusesIsExplainedInItsWords) {
   EXPECT_EQ(outcome.exit_code, 1);
   EXPECT_THAT(outcome.output, HasSubstr("VMQ1008E"));
   EXPECT_THAT(outcome.output, HasSubstr("(parameters: SETCONFIG,ux,1," + (home / "zlpqor6/lx8266/bin/vmq_xa") +
-                                        " -p  -pc ux,vmq_xa: the configuration has no PORT"));
+                                        " -p  -pc ux,vmq_xa: the configuration has no PORT that is a number"));
   EXPECT_EQ(readWholeFile(home / "config/ux.config"), before);
 }
 
