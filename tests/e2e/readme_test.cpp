@@ -102,13 +102,13 @@ TEST_F(Readme, SessionDoesWhatItShows) {
   replace(typed, "vmqd.conf &\n",
           "vmqd.conf &\nuntil vmqctl status --socket $H/sock >$H/status 2>&1; do sleep 0.1; done\n");
   replace(typed, "TRANSID=t1' &\n",
-          "TRANSID=t1' &\nvmqctl watch t1 --count 1 & event=$!\n"
-          "until vmqctl status | grep -q 'watchers  *2$'; do sleep 0.1; done\n");
-  replace(typed, "\"PRODUCT\": \"ux\"}}'; echo\n", "\"PRODUCT\": \"ux\"}}'; echo\nwait $event\n");
+          "TRANSID=t1' > >(tee $H/stream) &\nuntil grep -qs open $H/stream; do sleep 0.1; done\n");
+  replace(typed, "\"PRODUCT\": \"ux\"}}'; echo\n",
+          "\"PRODUCT\": \"ux\"}}'; echo\nuntil grep -q RETVAL $H/stream; do sleep 0.1; done\n");
   replace(typed, "vmqctl complete-install\n",
           "until [ -s $H/depot/rc.txt ]; do sleep 0.1; done\nvmqctl complete-install\n");
   replace(typed, "watch t2 --count 1 2>/dev/null &\n",
-          "watch t2 --count 1 2>$H/watching & event=$!\nuntil grep -q watching $H/watching; do sleep 0.1; done\n");
+          "watch t2 --count 1 2>$H/watching & event=$!\nuntil grep -qs watching $H/watching; do sleep 0.1; done\n");
   replace(typed, "t2 --no-wait\n", "t2 --no-wait\nwait $event\n");
   std::ofstream(tree / "session") << typed;
 
