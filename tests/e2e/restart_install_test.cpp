@@ -60,6 +60,8 @@ TEST_F(RestartInstall, FailureOfTheInstallerIsToldByTheNextDaemon) {
   EXPECT_EQ(completed.exit_code, 1);
   EXPECT_THAT(completed.output, HasSubstr("VMQ1031E"));
   EXPECT_THAT(completed.output, HasSubstr("(parameters: " + inDepot("rc.txt") + ",28)"));
+  EXPECT_THAT(completed.output, HasSubstr("look at stdout.txt, stderr.txt and rc.txt in the depot"));
+  EXPECT_THAT(completed.output, Not(HasSubstr("trace of vmqd"))) << "the daemon before this one began it";
   EXPECT_EQ(readWholeFile(inDepot("stderr.txt")), "database not converted\n");
   EXPECT_FALSE(fs::exists(home / "registry/rms.tbl")) << "what is not installed must not be registered";
   EXPECT_TRUE(successor.stop());

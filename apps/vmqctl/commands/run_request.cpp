@@ -129,8 +129,10 @@ void write(const Session& session, const Request& request, const RequestOptions&
                              layoutFor(session.console.out())));
 }
 
-/// Where what the command printed can be read: the daemon traces it when a command exits non-zero.
-std::string outputHint(long returnValue) {
+/// Where what the command printed can be read: the daemon traces it when a command exits non-zero. What an installer
+/// printed that may restart the daemon is in files of the depot, which the message names.
+std::string outputHint(const Request& request, long returnValue) {
+  if (request.command == "COMPLETE_INSTALL" || parameter(request, "OPTIONAL") == "REQUIRES_RESTART") return "";
   constexpr long exitedNonZero[] = {1008, 1016, 1024, 1031, 1032};
   if (std::find(std::begin(exitedNonZero), std::end(exitedNonZero), returnValue) == std::end(exitedNonZero)) return "";
   return "What the command printed is in the trace of vmqd, in the lines STDOUT and STDERR.";
@@ -191,7 +193,7 @@ ExitCode runRequest(Session& session, const Request& request, const RequestOptio
   if (report.details.returnValue != 0) {
     session.console.error(
         words + (report.result == std::string_view("refused") ? " was refused: " : " failed: ") + details,
-        outputHint(report.details.returnValue));
+        outputHint(request, report.details.returnValue));
     return ExitCode::Failed;
   }
   // A restart whose stop failed and whose start succeeded is a success that carries the stop's message.
