@@ -12,8 +12,7 @@
 
 #include "bss1.h"
 
-// ---- identifiers and codes
-// -------------------------------------------------------------------------------------------
+// ---- identifiers and codes -----------------------------------------------------------------------------------------
 
 /// Identifies an interface or a type; the bytes in the order in which its text names them.
 struct rpc__uuid {
@@ -33,8 +32,7 @@ enum rpc__fault : uint32_t {
   rpc__fault_no_memory = 0x1c00001b,      ///< the server has no memory for the call
 };
 
-// ---- data representation
-// ---------------------------------------------------------------------------------------------
+// ---- data representation -------------------------------------------------------------------------------------------
 
 enum rpc__integers : uint8_t { rpc__big_endian = 0, rpc__little_endian = 1 };
 enum rpc__characters : uint8_t { rpc__ascii = 0, rpc__ebcdic = 1 };
@@ -72,8 +70,7 @@ inline uint32_t rpc__swap_32(uint32_t value) {
   return __builtin_bswap32(value);
 }
 
-// ---- calls
-// -------------------------------------------------------------------------------------------------------------
+// ---- calls ---------------------------------------------------------------------------------------------------------
 
 /// The caller at the other end of a call; the runtime's own. Manager routines receive it and may ignore it.
 struct rpc__binding;
@@ -140,8 +137,7 @@ void rpc__free_pkt(struct rpc__packet* packet);
 
 }  // extern "C"
 
-// ---- exception frames
-// --------------------------------------------------------------------------------------------------
+// ---- exception frames ----------------------------------------------------------------------------------------------
 
 class PFM1_Frame;
 

@@ -41,8 +41,7 @@ struct Registered {
   Registered(const Registered&) = delete;
 };
 
-// ---- registration
-// ------------------------------------------------------------------------------------------------------
+// ---- registration --------------------------------------------------------------------------------------------------
 
 TEST(RpcRegistration, RefusesWhatCannotBeCalled) {
   const rpc__if_spec interface = newSampleInterface();
@@ -82,8 +81,7 @@ TEST(RpcRegistration, CanBeMadeToFail) {
   EXPECT_EQ(vmqhost::call({interface.id}).outcome, RpcResult::kUnknownInterface);
 }
 
-// ---- calls
-// ---------------------------------------------------------------------------------------------------------------
+// ---- calls ---------------------------------------------------------------------------------------------------------
 
 TEST(RpcCalls, ReachTheStubAndBringItsReply) {
   const Registered registered([](const rpc__call& call) {
@@ -155,8 +153,7 @@ TEST(RpcCalls, MayCallOthers) {
   EXPECT_EQ(outer.call().reply, "inner fault");
 }
 
-// ---- memory and packets
-// --------------------------------------------------------------------------------------------------
+// ---- memory and packets --------------------------------------------------------------------------------------------
 
 TEST(RpcMemory, IsGivenAndTakenBack) {
   void* const nothing = rpc__malloc(0);
@@ -195,8 +192,7 @@ TEST(RpcMemory, CanBeMadeToFail) {
   EXPECT_EQ(rpc__alloc_pkt(1), nullptr);
 }
 
-// ---- frames
-// ----------------------------------------------------------------------------------------------------------------
+// ---- frames --------------------------------------------------------------------------------------------------------
 
 std::string cleaned;
 
@@ -252,8 +248,7 @@ TEST(FramesDeathTest, FaultThatNobodyTakesEndsTheProcess) {
   EXPECT_DEATH(PFM1__Raise(5), "");
 }
 
-// ---- marshalling
-// -----------------------------------------------------------------------------------------------------------
+// ---- marshalling ---------------------------------------------------------------------------------------------------
 
 TEST(Marshalling, KnowsThisMachine) {
   ASSERT_EQ(BSS1_InitializeOnce(&rpc__marshalling_once, rpc__initialize_marshalling), 0);
@@ -293,8 +288,7 @@ TEST(Marshalling, SwapsIntegers) {
   EXPECT_EQ(rpc__swap_32(0x12345678), 0x78563412u);
 }
 
-// ---- identifiers and labels as text
-// ----------------------------------------------------------------------------------------
+// ---- identifiers and labels as text --------------------------------------------------------------------------------
 
 TEST(UuidText, IsReadInEitherCase) {
   const rpc__uuid id{{0xd9, 0x8c, 0xf2, 0xa5, 0x2f, 0xae, 0x4d, 0x68, 0xb0, 0x05, 0x64, 0x6f, 0xf8, 0x3e, 0xed, 0x82}};

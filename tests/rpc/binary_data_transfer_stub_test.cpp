@@ -18,8 +18,7 @@ namespace {
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-// ---- packets, byte by byte
-// -------------------------------------------------------------------------------------------------
+// ---- packets, byte by byte -----------------------------------------------------------------------------------------
 
 constexpr rpc__drep littleAscii{rpc__little_endian, rpc__ascii};
 constexpr rpc__drep bigAscii{rpc__big_endian, rpc__ascii};
@@ -69,8 +68,7 @@ std::string inEbcdic(std::string packet) {
   return packet;
 }
 
-// ---- a manager that remembers
-// ------------------------------------------------------------------------------------------------
+// ---- a manager that remembers --------------------------------------------------------------------------------------
 
 struct Received {
   std::string firstText;
@@ -155,8 +153,7 @@ void expectTheTwoBlocks() {
   EXPECT_EQ(std::string(reinterpret_cast<char*>(received->blocks[1].data), 4096), field(everyByte(0x205), 4096, 'z'));
 }
 
-// ---- what is in a packet
-// -----------------------------------------------------------------------------------------------------
+// ---- what is in a packet -------------------------------------------------------------------------------------------
 
 TEST_F(StubTest, ReadsLittleEndianPackets) {
   ASSERT_EQ(littlePacket().size(), 356u + 2 * 4100);
@@ -211,8 +208,7 @@ TEST_F(StubTest, WhatStandsBehindTheBlocksIsIgnored) {
   expectTheTwoBlocks();
 }
 
-// ---- the reply
-// ---------------------------------------------------------------------------------------------------------------
+// ---- the reply -----------------------------------------------------------------------------------------------------
 
 TEST_F(StubTest, RepliesWithTheStatusInTheOfferedPacket) {
   replied = 0x01020304;
@@ -236,8 +232,7 @@ TEST_F(StubTest, RepliesInANewPacketWhenTheOfferedOneIsTooSmall) {
   }
 }
 
-// ---- faults
-// --------------------------------------------------------------------------------------------------------------------
+// ---- faults --------------------------------------------------------------------------------------------------------
 
 TEST_F(StubTest, PacketThatEndsTooEarlyIsAFaultWhereverItEnds) {
   const std::string little = littlePacket();

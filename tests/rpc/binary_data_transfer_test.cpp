@@ -28,8 +28,7 @@ using testing::Not;
 
 using BinaryDataTransferTest = TransferTest;
 
-// ---- what is stored
-// ----------------------------------------------------------------------------------------------------
+// ---- what is stored ------------------------------------------------------------------------------------------------
 
 TEST_F(BinaryDataTransferTest, StoresTheBlocksInOrderUnderTheDepot) {
   EXPECT_EQ(transfer("file.bin", 1, {"one ", std::string("\0\xFF\r\x1A", 4), " two"}), 0u);
@@ -111,8 +110,7 @@ TEST_F(BinaryDataTransferTest, LeavesNoDescriptor) {
   EXPECT_EQ(ProcessResources::now(), before);
 }
 
-// ---- names
-// ---------------------------------------------------------------------------------------------------------------
+// ---- names ---------------------------------------------------------------------------------------------------------
 
 TEST_F(BinaryDataTransferTest, BackslashesSeparateLikeSlashes) {
   EXPECT_EQ(transfer("dir\\sub\\install.sh", 1, {"a\r\nb\r\n"}), 0u);
@@ -179,8 +177,7 @@ TEST_F(BinaryDataTransferTest, NameOfADirectoryCannotBeOpened) {
   EXPECT_TRUE(trace_.has(RAS1_ERROR, "Failed to open file " + depot_ + "dir using mode \"wb\", check permissions"));
 }
 
-// ---- where it goes
-// -------------------------------------------------------------------------------------------------------
+// ---- where it goes -------------------------------------------------------------------------------------------------
 
 TEST_F(BinaryDataTransferTest, MakesTheDirectoriesThatTheNameCallsFor) {
   const mode_t before = umask(0);
@@ -253,8 +250,7 @@ TEST_F(BinaryDataTransferTest, ReadOnlyFileSystem) {
   EXPECT_EQ(transfer("dir/file", 1, {"a"}), 6u);
 }
 
-// ---- what can go wrong while it is written
-// ---------------------------------------------------------------------------------
+// ---- what can go wrong while it is written -------------------------------------------------------------------------
 
 TEST_F(BinaryDataTransferTest, FullFileSystemIsAFailureThatKeepsWhatWasWritten) {
   const ScratchFileSystem scratch(directory_ / "scratch", 64);
@@ -333,8 +329,7 @@ TEST_F(BinaryDataTransferTest, ExceptionIsAStatus) {
   EXPECT_TRUE(trace_.has(RAS1_ERROR, "Exception while storing a chunk: std::bad_alloc"));
 }
 
-// ---- conversion
-// ------------------------------------------------------------------------------------------------------------
+// ---- conversion ----------------------------------------------------------------------------------------------------
 
 TEST_F(BinaryDataTransferTest, ConvertsWhatItIsInterestedIn) {
   for (const char* const name :
@@ -382,8 +377,7 @@ TEST_F(BinaryDataTransferTest, FailedConversionIsNotTold) {
   EXPECT_THAT(trace_.texts(RAS1_ERROR), ElementsAre("Could not open [" + work_file_ + "] for writing."));
 }
 
-// ---- several at a time
-// -------------------------------------------------------------------------------------------------------
+// ---- several at a time ---------------------------------------------------------------------------------------------
 
 /// Pushes a file of its own in many chunks.
 void push(const std::string& name, char letter, int chunks) {

@@ -102,8 +102,7 @@ TEST_F(ConvertDos2UnixTest, LeavesNoDescriptor) {
   EXPECT_EQ(ProcessResources::now().descriptors, before);
 }
 
-// ---- the work file
-// -------------------------------------------------------------------------------------------------------
+// ---- the work file -------------------------------------------------------------------------------------------------
 
 TEST_F(ConvertDos2UnixTest, OldWorkFileIsRemovedNotWrittenTo) {
   const std::string path = newScript();
@@ -155,8 +154,7 @@ TEST_F(ConvertDos2UnixTest, DoesNotConvertTheWorkFileItself) {
   EXPECT_EQ(readWholeFile(path), "line\r\n");
 }
 
-// ---- failures
-// ------------------------------------------------------------------------------------------------------------
+// ---- failures ------------------------------------------------------------------------------------------------------
 
 TEST_F(ConvertDos2UnixTest, MissingFile) {
   EXPECT_EQ(convertDOS2Unix((depot_ + "none").c_str()), -1);

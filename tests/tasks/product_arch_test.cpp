@@ -31,8 +31,7 @@ class ProductLookups : public testing::Test {
   TEST_TraceCapture trace;
 };
 
-// ---- the inventory listing
-// -------------------------------------------------------------------------------------------
+// ---- the inventory listing -----------------------------------------------------------------------------------------
 
 TEST_F(ProductLookups, ProductIsFoundInTheInventory) {
   inventory("before\n" + kHeader + "\n" + line("ax", "lx8266") + line("ux", "lx8266"));
@@ -94,8 +93,7 @@ TEST_F(ProductLookups, HeaderWithNothingBehindItFindsNothing) {
   EXPECT_FALSE(isProductInStandardInventory("ux"));
 }
 
-// ---- the architecture of libraries
-// -------------------------------------------------------------------------------------
+// ---- the architecture of libraries ---------------------------------------------------------------------------------
 
 TEST_F(ProductLookups, FirstLineWinsWithoutAHint) {
   inventory(kHeader + "\n" + line("ux", "aix533") + line("ux", "lx8266"));
@@ -150,8 +148,7 @@ TEST_F(ProductLookups, NoSharedLibrariesNoDirectory) {
   EXPECT_EQ(getSharedLibArchDir().toNarrow(), "");
 }
 
-// ---- the platform listing
-// ------------------------------------------------------------------------------------------------
+// ---- the platform listing ------------------------------------------------------------------------------------------
 
 TEST_F(ProductLookups, ArchitectureOfAProductIsInThePlatformListing) {
   inventory("Platform codes:\naix533 Product (ux)\nlx8266 Product (um)\nlx6266: Product (um)\n");

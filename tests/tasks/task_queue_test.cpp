@@ -33,6 +33,7 @@ std::string takenTransid() {
 class TaskQueue : public testing::Test {
  protected:
   void SetUp() override {
+    (void)String("converted before there are threads, as the entry point does");
     initializeTaskQueue();
     trace.clear();
   }

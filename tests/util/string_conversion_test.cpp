@@ -124,8 +124,7 @@ TEST(StringInUtf8Test, ZeroUnitsWithinATextAreData) {
   EXPECT_STREQ(textOf({'a', 0, 'b'}).c_str().get(), "a");
 }
 
-// ---- the C locale
-// -----------------------------------------------------------------------------------------------------
+// ---- the C locale --------------------------------------------------------------------------------------------------
 
 TEST(StringInTheCLocaleTest, EveryByteBecomesOneUnitAndComesBack) {
   const LocaleInEffect c("C");
@@ -147,8 +146,7 @@ TEST(StringInTheCLocaleTest, UnitWithoutAPlaceBecomesAQuestionMark) {
   EXPECT_STREQ(textOf({'a', 0x20AC, 'z'}).c_str().get(), "a?z");
 }
 
-// ---- a double-byte code page
-// ------------------------------------------------------------------------------------------
+// ---- a double-byte code page ---------------------------------------------------------------------------------------
 
 TEST(StringInCodePage932Test, NameIsCutButDataIsNot) {
   const CodePageInEffect japanese(NLS2_CP932);
@@ -159,8 +157,7 @@ TEST(StringInCodePage932Test, NameIsCutButDataIsNot) {
   EXPECT_EQ(text.toNarrow(), narrow);
 }
 
-// ---- lengths
-// ----------------------------------------------------------------------------------------------------------
+// ---- lengths -------------------------------------------------------------------------------------------------------
 
 TEST(StringConversionTest, AsciiOfEveryLengthIsTheSameBothWays) {
   for (const char* locale : {"C", "C.UTF-8"}) {
@@ -176,8 +173,7 @@ TEST(StringConversionTest, AsciiOfEveryLengthIsTheSameBothWays) {
   }
 }
 
-// ---- the choice of the locale
-// -------------------------------------------------------------------------------------------
+// ---- the choice of the locale --------------------------------------------------------------------------------------
 
 TEST(StringConversionTest, ChosenCodePageIsTraced) {
   std::setlocale(LC_CTYPE, "C.UTF-8");

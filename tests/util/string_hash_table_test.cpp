@@ -203,8 +203,7 @@ TEST(StringKeyOrderTest, EmptiedTableKeepsItsSize) {
   EXPECT_EQ(keysOf(map.getKeys()), (Keys{"b", "c"}));
 }
 
-// ---- random comparison
-// ------------------------------------------------------------------------------------------------
+// ---- random comparison ---------------------------------------------------------------------------------------------
 
 void compareWithTwins(unsigned int seed, int steps) {
   SCOPED_TRACE("seed " + std::to_string(seed));

@@ -103,8 +103,7 @@ TEST(StringFindTest, CharFromTheUpperHalfNeverFindsALatinLetter) {
   EXPECT_EQ(text.find(static_cast<unsigned short>(0x00E9), 0u), 0u);
 }
 
-// ---- one character that is not escaped
-// --------------------------------------------------------------------------------
+// ---- one character that is not escaped -----------------------------------------------------------------------------
 
 struct Unescaped {
   const char* text;

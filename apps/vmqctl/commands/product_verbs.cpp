@@ -31,8 +31,7 @@ std::string joined(const std::vector<std::string>& words) {
   return text;
 }
 
-// ---- options
-// ---------------------------------------------------------------------------------------------------------
+// ---- options -------------------------------------------------------------------------------------------------------
 
 void takesTarget(CLI::App& verb, Arguments& a, const char* description) {
   verb.add_option("--target", a.target, description)->type_name("MSN")->check(notEmpty);
@@ -80,8 +79,7 @@ void addDaConfigOptions(CLI::App& verb, Arguments& a) {
 
 void addNoOptions(CLI::App&, Arguments&) {}
 
-// ---- requests
-// --------------------------------------------------------------------------------------------------------
+// ---- requests ------------------------------------------------------------------------------------------------------
 
 void buildInstall(Request& request, const Arguments& a) {
   request = installRequest(a);
@@ -127,8 +125,7 @@ void buildDaConfig(Request& request, const Arguments& a) {
 
 void buildNothing(Request&, const Arguments&) {}
 
-// ---- the verbs
-// -------------------------------------------------------------------------------------------------------
+// ---- the verbs -----------------------------------------------------------------------------------------------------
 
 struct ProductVerb {
   const char* name;

@@ -31,8 +31,7 @@ struct DeployArguments {
   bool verify = false;
 };
 
-// ---- what both do
-// ----------------------------------------------------------------------------------------------------
+// ---- what both do --------------------------------------------------------------------------------------------------
 
 void tellEmptyFolders(const Session& session, const PushPlan& plan) {
   for (const std::string& folder : plan.emptyFolders()) {
@@ -61,8 +60,7 @@ std::string notSentLine() {
          " for each file";
 }
 
-// ---- push
-// ------------------------------------------------------------------------------------------------------------
+// ---- push ----------------------------------------------------------------------------------------------------------
 
 void write(const Session& session, const Pusher& pusher) {
   const Json report = pusher.report();
@@ -106,8 +104,7 @@ ExitCode runPush(Session& session, const PushArguments& arguments) {
   return ExitCode::Done;
 }
 
-// ---- deploy
-// ----------------------------------------------------------------------------------------------------------
+// ---- deploy --------------------------------------------------------------------------------------------------------
 
 /// Where an install of the product looks for its files, relative to the depot.
 std::string deployFolder(const InstallArguments& install) {

@@ -125,8 +125,7 @@ TEST(Faults, AreWhatExceptionsBecome) {
   EXPECT_EQ(200, callOperation(client, 0, "").status);
 }
 
-// ---- how large packets may be
-// ----------------------------------------------------------------------------------------------
+// ---- how large packets may be --------------------------------------------------------------------------------------
 
 TEST(Packets, MayBeLargerThanOtherBodies) {
   const TestDaemon daemon({"maximum_request_bytes = 1024", "maximum_packet_bytes = 100000"});
@@ -170,8 +169,7 @@ TEST(Packets, NeedNotTellTheirLengthBefore) {
   EXPECT_EQ(413, callUnannounced(client, std::string(10001, 'x')).status);
 }
 
-// ---- how many packets there may be
-// -------------------------------------------------------------------------------------------
+// ---- how many packets there may be ---------------------------------------------------------------------------------
 
 TEST(PacketMemory, CallsWithoutRoomAreToldToComeAgain) {
   const TestDaemon daemon({"maximum_packet_bytes = 10000", "packet_memory_bytes = 20000"});

@@ -179,8 +179,7 @@ void fail(TestRequest& request) {
   if (request.predicate("TEXT") == "sample") throw std::runtime_error("told to fail");
 }
 
-// ---- the interface
-// ---------------------------------------------------------------------------------------------------
+// ---- the interface -------------------------------------------------------------------------------------------------
 
 std::string bodyOf(const rpc__call& call) {
   return {reinterpret_cast<const char*>(call.request->body), call.request->body_bytes};
