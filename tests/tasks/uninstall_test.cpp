@@ -78,6 +78,7 @@ END)");
                           home.path() + "/bin/qinfo -d ", home.path() + "/bin/uninstall.sh -i ux lx8266"));
   EXPECT_TRUE(trace.has(RAS1_DETAIL, "UnInstall command is [" + home.path() + "/bin/uninstall.sh -i ux lx8266]"));
   EXPECT_TRUE(trace.has(RAS1_DETAIL, "UnInstall returned 0 return code."));
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "Return code is 0"));
 }
 
 TEST_F(Removals, ProductWhoseDescriptionHasACommaIsRemovedByTheCommandOfTheRequest) {
@@ -119,6 +120,7 @@ END)");
   request.product = "ux";
   EXPECT_EQ(removeInstance(request), TASK_OK);
   EXPECT_EQ(commandLines(trace).back(), translator + " -r  -pc ux");
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "Return code is 0"));
 }
 
 }  // namespace
