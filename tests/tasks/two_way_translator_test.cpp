@@ -13,9 +13,9 @@ namespace {
 using testing::ElementsAre;
 using testing::IsEmpty;
 
-class InstanceName : public testing::Test {
+class Translator : public testing::Test {
  protected:
-  InstanceName() {
+  Translator() {
     home.tool("bin/qinfo", R"(cat <<'END'
 "ProdCode","Description","Platform","Version","Release"
 "ux","Unix agent","lx8266","062000000","100"
@@ -31,6 +31,8 @@ END)");
   InstallationHome home;
   TEST_TraceCapture trace;
 };
+
+using InstanceName = Translator;
 
 TEST_F(InstanceName, IsWhatTheTranslatorPrintsTrimmed) {
   translator("printf ' inst1\\n'");
@@ -82,7 +84,18 @@ TEST_F(InstanceName, IsEmptyWhenTheTranslatorFailsWhateverItPrinted) {
                         "Received bad return code [65] from two-way translator command [" + command("m1:UX") + "]"));
 }
 
-TEST_F(InstanceName, TranslatorThatWasFoundIsTraced) {
+TEST_F(Translator, ConfiguringTracesItsResult) {
+  translator("exit 0");
+  for (TASK_RC (*task)(TaskQueueElem&) : {getConfig, setConfig}) {
+    trace.clear();
+    TaskQueueElem request;
+    request.product = "ux";
+    EXPECT_EQ(task(request), TASK_OK);
+    EXPECT_TRUE(trace.has(RAS1_DETAIL, "Return code is 0"));
+  }
+}
+
+TEST_F(Translator, ThatWasFoundIsTraced) {
   translator("exit 0");
   VMQ::String path("whatever");
   EXPECT_TRUE(getTwoWayTranslator(path));
@@ -90,7 +103,7 @@ TEST_F(InstanceName, TranslatorThatWasFoundIsTraced) {
   EXPECT_TRUE(trace.has(RAS1_DETAIL, "Using default two-way translator [" + path.toNarrow() + "]"));
 }
 
-TEST_F(InstanceName, TranslatorThatIsMissingLeavesNoPath) {
+TEST_F(Translator, ThatIsMissingLeavesNoPath) {
   VMQ::String path("whatever");
   EXPECT_FALSE(getTwoWayTranslator(path));
   EXPECT_EQ(path.toNarrow(), "");
