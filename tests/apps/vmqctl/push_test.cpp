@@ -376,7 +376,7 @@ TEST_F(Push, BusyDaemonIsAskedAgain) {
     }
   });
   EXPECT_EQ(run({"push", directory_.writeFile("a", std::string(8193, 'a'))}).code, 0);
-  EXPECT_THAT(labels(), ElementsAre("a#1", "a#1", "a#1", "a#1", "a#2"));
+  ASSERT_THAT(labels(), ElementsAre("a#1", "a#1", "a#1", "a#1", "a#2"));
   EXPECT_EQ(packets_[0], packets_[3]);
 }
 
