@@ -7,7 +7,7 @@
 #include "test_seam.h"
 
 extern "C" [[gnu::visibility("default")]] unsigned Initialize_Mgmt_Functions() {
-  new TEST_RecordedSleeps;  // for the life of the process
+  [[maybe_unused]] static const auto* const kept = new TEST_RecordedSleeps;  // for the life of the process
   void* const component = dlopen(VMQ_COMPONENT, RTLD_NOW | RTLD_LOCAL);
   if (component == nullptr) {
     (void)std::fprintf(stderr, "%s\n", dlerror());
