@@ -106,7 +106,7 @@ MHD_Result HttpConnection::begin(const char* method, const char* path) {
 void HttpConnection::makeRoomForPacket(size_t bytes) {
   share_ = server_.packet_memory_.take(bytes);
   no_room_ = !share_;
-  if (share_) body_.reserve(bytes);  // at once, so that it is never copied
+  if (share_) body_ = server_.packet_memory_.takeBuffer(bytes);  // at once, so that it is never copied
 }
 
 std::string_view HttpConnection::headerValue(const char* name) const {
@@ -144,7 +144,7 @@ MHD_Result HttpConnection::answer(const char* method, const char* path) {
 }
 
 void HttpConnection::giveRoomBack() {
-  std::string().swap(body_);
+  server_.packet_memory_.giveBack(std::exchange(body_, std::string()));
   share_.reset();
 }
 

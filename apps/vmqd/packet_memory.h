@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <mutex>
 #include <optional>
+#include <string>
 #include <utility>
 
 namespace vmqd {
@@ -35,12 +36,19 @@ class PacketMemory {
   /// Nothing when there is no room for it now.
   [[nodiscard]] std::optional<Share> take(size_t bytes);
 
+  /// An empty buffer with room for so many bytes: the spare one, or a new one. For who has taken them.
+  [[nodiscard]] std::string takeBuffer(size_t bytes);
+  /// Keeps one buffer, of 8 MiB at most, for the next packet: pages that are new from the system cost more than what is
+  /// done with them.
+  void giveBack(std::string buffer);
+
  private:
   void giveBack(size_t bytes);
 
   const size_t maximum_bytes_;
   std::mutex mutex_;
-  size_t taken_bytes_ = 0;  // guarded by mutex_
+  size_t taken_bytes_ = 0;  // guarded by mutex_, like what follows
+  std::string spare_;
 };
 
 }  // namespace vmqd

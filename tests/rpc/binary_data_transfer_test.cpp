@@ -41,6 +41,19 @@ TEST_F(BinaryDataTransferTest, StoresFullBlocks) {
   EXPECT_EQ(readWholeFile(depot_ + "file"), full + full + "end");
 }
 
+TEST_F(BinaryDataTransferTest, StoresManyBlocksOfAnyLengths) {
+  std::vector<std::string> texts;
+  std::string whole;
+  for (size_t block = 0; block < 2500; ++block) {
+    texts.emplace_back(block % 3 == 0 ? 4096 : block * 7 % 4097, static_cast<char>(block));
+    if (block % 1024 < 3) texts.back().clear();
+    whole += texts.back();
+  }
+  EXPECT_EQ(transfer("file", 1, texts), 0u);
+  EXPECT_EQ(transfer("file", 2, texts), 0u);
+  EXPECT_TRUE(readWholeFile(depot_ + "file") == whole + whole);
+}
+
 TEST_F(BinaryDataTransferTest, AppendsLaterChunksInTheOrderOfTheirArrival) {
   EXPECT_EQ(transfer("file", 1, {"a"}), 0u);
   EXPECT_EQ(transfer("file", 7, {"b"}), 0u);
@@ -260,6 +273,16 @@ TEST_F(BinaryDataTransferTest, FullFileSystemIsAFailureThatKeepsWhatWasWritten) 
   EXPECT_EQ(transfer("file", 1, tooMuch), 5u);
   EXPECT_TRUE(trace_.has(RAS1_ERROR, "Error writing chunk 16, error number was 1"));
   EXPECT_EQ(fs::file_size(depot_ + "file"), 64u * 1024);
+}
+
+TEST_F(BinaryDataTransferTest, BlockThatOnlyBeginsToFitIsTheOneThatFails) {
+  const ScratchFileSystem scratch(directory_ / "scratch", 8);
+  if (!scratch.isMounted()) GTEST_SKIP() << "needs a file system of its own";
+  moveDepot(directory_ / "scratch");
+  const std::string a(3000, 'a'), b(3000, 'b'), c(3000, 'c');
+  EXPECT_EQ(transfer("file", 1, {a, "", b, "", c, "more"}), 5u);
+  EXPECT_TRUE(trace_.has(RAS1_ERROR, "Error writing chunk 4, error number was 1"));
+  EXPECT_EQ(readWholeFile(depot_ + "file"), a + b + c.substr(0, 8192 - 6000));
 }
 
 /// The descriptor under which this process has the file open; -1 for none.
