@@ -16,7 +16,7 @@ class DataAgent : public Deployment {
  protected:
   DataAgent() {
     startHurriedDaemon();
-    stageBundles();
+    sendBundles();
   }
 
   [[nodiscard]] std::string shown(const std::string& agent = "um") const {

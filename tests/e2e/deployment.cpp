@@ -26,10 +26,16 @@ Outcome Deployment::vmqctl(const std::string& arguments) const {
   return runShell("VMQ_SOCKET=" + quoted(daemon->socket()) + " " VMQ_PROGRAMS "/vmqctl " + arguments + " </dev/null");
 }
 
-void Deployment::stageBundles() const {
-  const Outcome outcome =
-      runShell("VMQ_EXPORTER=" + quoted(VMQ_EXPORTER) + " " VMQ_SOURCE_DIR "/examples/bundles/assemble --received " +
-               quoted(daemon->depot()));
+void Deployment::assembleBundles(const std::string& folder) {
+  const Outcome outcome = runShell("VMQ_EXPORTER=" + quoted(VMQ_EXPORTER) +
+                                   " " VMQ_SOURCE_DIR "/examples/bundles/assemble " + quoted(folder));
+  EXPECT_EQ(outcome.exit_code, 0) << outcome.output;
+}
+
+void Deployment::sendBundles() const {
+  const TemporaryDirectory folder;
+  assembleBundles(folder / "bundles");
+  const Outcome outcome = vmqctl("push " + quoted(folder / "bundles") + "/*");
   EXPECT_EQ(outcome.exit_code, 0) << outcome.output;
 }
 

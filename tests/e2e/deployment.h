@@ -38,8 +38,10 @@ class Deployment : public testing::Test {
   /// vmqctl with these arguments, as a shell reads them.
   [[nodiscard]] Outcome vmqctl(const std::string& arguments) const;
 
-  /// Lays the sample bundles into the depot as a transfer leaves them there.
-  void stageBundles() const;
+  /// Puts the sample bundles together, as they are before they are sent.
+  static void assembleBundles(const std::string& folder);
+  /// Sends all of them to the depot.
+  void sendBundles() const;
 
   /// The rows of a query. Predicates go out in the order of their names.
   Json query(const std::string& table, const Json& predicates);

@@ -25,7 +25,7 @@ class ProductLife : public Deployment {
 
 TEST_F(ProductLife, FromInstallToRemoval) {
   startHurriedDaemon();
-  stageBundles();
+  sendBundles();
   const std::string program = home / "zlpqor6/lx8266/ux/bin/prometheus-node-exporter";
 
   // Installed by an installer that restarts the daemon; the daemon after it knows how that went.

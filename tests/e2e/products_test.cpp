@@ -19,7 +19,7 @@ class Products : public Deployment {
  protected:
   Products() {
     startHurriedDaemon();
-    stageBundles();
+    sendBundles();
   }
 
   /// Writes an installer for product "rp", version "1.0", and returns what stands for it in a request.

@@ -15,7 +15,7 @@ class RestartInstall : public Deployment {
  protected:
   RestartInstall() {
     startHurriedDaemon();
-    stageBundles();
+    sendBundles();
   }
 
   [[nodiscard]] std::string inDepot(const std::string& name) const { return daemon->depot() + "/" + name; }
@@ -93,7 +93,7 @@ TEST_F(RestartInstall, InstallerThatLeavesTheDaemonAloneIsToldTwice) {
   EXPECT_THAT(watcher.next(), Failed(1031, "/bin/sh " + inDepot("runcmd.sh") + " " +
                                                inDepot("ux/010100000/install.sh ") + home.path() + " no-such-file,64"));
   EXPECT_THAT(vmqctl("complete-install").output, HasSubstr("(parameters: " + inDepot("rc.txt") + ",64)"));
-  EXPECT_THAT(readWholeFile(inDepot("stderr.txt")), HasSubstr("usage: install.sh HOME RESPONSES"));
+  EXPECT_THAT(readWholeFile(inDepot("stderr.txt")), HasSubstr("usage: install.sh HOME [RESPONSES]"));
 }
 
 TEST_F(RestartInstall, WithoutATranslatorNothingIsRun) {

@@ -1,10 +1,11 @@
 #!/bin/sh
 # Installs the Unix host agent, or removes it:
 #
-#   install.sh HOME RESPONSES
+#   install.sh HOME [RESPONSES]
 #
 # RESPONSES is a file of lines KEY=value: ACTION, install or uninstall; PORT, where the agent is to answer when it has no
-# configuration yet. The version is the name of this folder. Agents that run go on as they are until they are restarted.
+# configuration yet. By default it is ux_Silent_Install.txt beside this. The version is the name of this folder. Agents
+# that run go on as they are until they are restarted.
 # Exit status: 0 done; 1 failed; 64 command line not understood.
 set -u
 
@@ -20,9 +21,9 @@ response() {
 
 here=$(cd "$(dirname "$0")" && pwd)
 home=${1-}
-responses=${2-}
-if [ $# -ne 2 ] || [ ! -d "$home/registry" ] || [ ! -r "$responses" ]; then
-  echo "usage: install.sh HOME RESPONSES" >&2
+responses=${2-$here/ux_Silent_Install.txt}
+if [ $# -lt 1 ] || [ $# -gt 2 ] || [ ! -d "$home/registry" ] || [ ! -r "$responses" ]; then
+  echo "usage: install.sh HOME [RESPONSES]" >&2
   exit 64
 fi
 case $(response ACTION) in
