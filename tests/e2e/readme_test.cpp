@@ -46,6 +46,7 @@ std::string lasting(std::string line) {
       {R"(vmqctl-\d{8}T\d{6}Z-[0-9a-f]{16})", "ID"},
       {R"(^((node_load1|sample_load\{.*\}) ).*)", "$1N"},
       {R"(^uptime .*)", "uptime N"},
+      {R"(\(\d+ MiB\))", "(N MiB)"},
       {R"( Linux +\w+ )", " Linux ARCH "},
       {" +", " "},
   };
