@@ -275,6 +275,15 @@ TEST_F(BinaryDataTransferTest, FullFileSystemIsAFailureThatKeepsWhatWasWritten) 
   EXPECT_EQ(fs::file_size(depot_ + "file"), 64u * 1024);
 }
 
+TEST_F(BinaryDataTransferTest, PartThatTheSystemDidNotTakeIsWrittenAfterIt) {
+  for (const int chunk : {1, 2}) {
+    const FailingFile writesHalf(FileCall::kWritev, 0);
+    EXPECT_EQ(transfer("file", chunk, {"abcdef", "", "gh", "i"}), 0u);
+    EXPECT_TRUE(writesHalf.happened());
+  }
+  EXPECT_EQ(readWholeFile(depot_ + "file"), "abcdefghiabcdefghi");
+}
+
 TEST_F(BinaryDataTransferTest, BlockThatOnlyBeginsToFitIsTheOneThatFails) {
   const ScratchFileSystem scratch(directory_ / "scratch", 8);
   if (!scratch.isMounted()) GTEST_SKIP() << "needs a file system of its own";

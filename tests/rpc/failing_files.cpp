@@ -1,6 +1,7 @@
 #include "tests/rpc/failing_files.h"
 
 #include <sys/stat.h>
+#include <sys/uio.h>
 #include <unistd.h>
 
 #include <atomic>
@@ -54,6 +55,7 @@ int __real_chmod(const char*, mode_t);
 int __real_unlink(const char*);
 int __real_link(const char*, const char*);
 int __real_fclose(FILE*);
+ssize_t __real_writev(int, const iovec*, int);
 
 int __wrap_chmod(const char* path, mode_t mode) {
   return fails(FileCall::kChmod) ? -1 : __real_chmod(path, mode);
@@ -70,6 +72,11 @@ int __wrap_link(const char* from, const char* to) {
 int __wrap_fclose(FILE* stream) {
   const int result = __real_fclose(stream);
   return fails(FileCall::kFclose) ? EOF : result;
+}
+
+ssize_t __wrap_writev(int descriptor, const iovec* pieces, int count) {
+  return fails(FileCall::kWritev) ? write(descriptor, pieces->iov_base, pieces->iov_len / 2)
+                                  : __real_writev(descriptor, pieces, count);
 }
 
 }  // extern "C"
