@@ -8,6 +8,7 @@
 #include <unistd.h>
 
 #include <array>
+#include <random>
 #include <string>
 
 namespace {
@@ -23,14 +24,18 @@ sockaddr_in loopback(uint16_t port) {
 }  // namespace
 
 OccupiedPort::OccupiedPort() : descriptor_(socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)), number_(0) {
-  sockaddr_in address = loopback(/*port=*/0);
-  socklen_t length = sizeof address;
-  if (bind(descriptor_, reinterpret_cast<sockaddr*>(&address), length) != 0 || listen(descriptor_, 16) != 0 ||
-      getsockname(descriptor_, reinterpret_cast<sockaddr*>(&address), &length) != 0) {
-    ADD_FAILURE() << "no free port on 127.0.0.1";
+  // Not from the range of which the system gives clients their ends of connections: one may get it meanwhile.
+  std::uniform_int_distribution<uint16_t> ports(20000, 29999);
+  std::random_device random;
+  for (int tries = 0; tries < 1000; ++tries) {
+    const uint16_t port = ports(random);
+    const sockaddr_in address = loopback(port);
+    if (bind(descriptor_, reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0) continue;
+    if (listen(descriptor_, 16) != 0) break;
+    number_ = port;
     return;
   }
-  number_ = ntohs(address.sin_port);
+  ADD_FAILURE() << "no free port on 127.0.0.1";
 }
 
 OccupiedPort::~OccupiedPort() {
