@@ -13,6 +13,7 @@ using VMQ::String;
 
 namespace {
 
+constexpr unsigned mostSteps = 30;
 constexpr size_t longest = 500;
 
 template <typename T>
@@ -30,7 +31,7 @@ class Twins {
   explicit Twins(fuzz::Input& input) : input_(input) {}
 
   void run() {
-    while (!input_.empty()) {
+    for (unsigned step = 0; step < mostSteps && !input_.empty(); ++step) {
       change();
       capacity_ = std::max(capacity_, static_cast<unsigned>(twin_.size()));
       fuzz::require(array_.getSize() == twin_.size(), "the size is the twin's");

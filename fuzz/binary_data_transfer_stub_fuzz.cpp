@@ -1,5 +1,5 @@
 // The packets of a file transfer, as they come from the network: first how the packet is written and answered, then the
-// packet. Whole blocks may be added behind, so that a small input reaches them.
+// packet. Zeros may be added for the texts in front and for whole blocks behind, so that a small input says much.
 
 #include <memory>
 
@@ -9,15 +9,18 @@
 
 namespace {
 
-enum Option : uint8_t { little = 1, ebcdic = 2, roomForTheReply = 4, aligned = 8, managerFails = 16 };
+enum Option : uint8_t { little = 1, ebcdic = 2, roomForTheReply = 4, aligned = 8, managerFails = 16, numbersOnly = 32 };
+constexpr size_t textBytes = 340;
 constexpr unsigned mostAddedBlocks = 3;
 
 /// In memory that ends with the packet.
 class Packet {
  public:
-  Packet(std::string_view bytes, size_t added, bool isAligned)
-      : offset_(isAligned ? 0 : 1), size_(bytes.size() + added), memory_(new unsigned char[offset_ + size_]()) {
-    bytes.copy(reinterpret_cast<char*>(body()), bytes.size());
+  Packet(size_t zerosInFront, std::string_view bytes, size_t zerosBehind, bool isAligned)
+      : offset_(isAligned ? 0 : 1),
+        size_(zerosInFront + bytes.size() + zerosBehind),
+        memory_(new unsigned char[offset_ + size_]()) {
+    bytes.copy(reinterpret_cast<char*>(body()) + zerosInFront, bytes.size());
   }
   unsigned char* body() { return memory_.get() + offset_; }
   rpc__packet packet() { return {body(), static_cast<uint32_t>(size_)}; }
@@ -34,9 +37,9 @@ class Packet {
 int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   fuzz::Input input(data, size);
   const uint8_t options = input.byte();
-  const size_t added = input.below(mostAddedBlocks + 1) * size_t{4100};
+  const size_t added = input.below(mostAddedBlocks + 1) * sizeof(DataBlock);
   const uint32_t status = input.byte();
-  Packet packet(input.rest(), added, (options & aligned) != 0);
+  Packet packet((options & numbersOnly) != 0 ? textBytes : 0, input.rest(), added, (options & aligned) != 0);
   const rpc__packet request = packet.packet();
   unsigned char room[64];
   rpc__packet offered{room, (options & roomForTheReply) != 0 ? uint32_t{sizeof room} : 3};
@@ -48,7 +51,8 @@ int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const PFM1_Frame outermost;
     const rpc__reply reply = BinaryDataTransfer_ssr({nullptr, &request, sender, &offered, &fuzz::checkingManager});
     fuzz::require(reply.bytes == 4 && *reply.packet->body == status, "the reply is the status");
-    fuzz::require((reply.packet == &offered) == (offered.body_bytes >= 4), "the offered packet is taken when it will do");
+    fuzz::require((reply.packet == &offered) == (offered.body_bytes >= 4),
+                  "the offered packet is taken when it will do");
     if (reply.packet != &offered) rpc__free_pkt(reply.packet);
   } catch (const PFM1_Fault& raised) {
     fault = raised.status;

@@ -22,6 +22,7 @@ Outcome read(const std::string& text) {
   } catch (const vmqd::ConfigurationError& wrong) {
     outcome.error = wrong.what();
     fuzz::require(outcome.error.starts_with(std::string(file) + ":"), "an error begins with the file");
+    fuzz::require(outcome.error.find('\n') == std::string::npos, "and is one line");
   }
   return outcome;
 }

@@ -10,11 +10,21 @@ using namespace VMQ;
 
 namespace {
 
+/// The XML library lets letters pass in Latin-1 that it refuses in UTF-8.
+bool isAscii(const unsigned short* name) {
+  for (; *name != 0; ++name) {
+    if (*name >= 0x80) return false;
+  }
+  return true;
+}
+
 /// Dumps escape nothing, on purpose, and blanks other than " " do not survive in an attribute.
 bool canBeDumped(DOMElement& element) {
+  if (!isAscii(element.getTagName())) return false;
   for (DOMNode* const node : *element.getAttributes()) {
-    const String value(static_cast<DOMAttr*>(node)->getValue());
-    if (value.toNarrow().find_first_of("<&\"\t\r\n") != std::string::npos) return false;
+    const auto& attribute = static_cast<DOMAttr&>(*node);
+    const std::string value = String(attribute.getValue()).toNarrow();
+    if (!isAscii(attribute.getName()) || value.find_first_of("<&\"\t\r\n") != std::string::npos) return false;
   }
   for (DOMNode* const child : *element.getChildren()) {
     if (!canBeDumped(static_cast<DOMElement&>(*child))) return false;

@@ -1,5 +1,5 @@
-// In place of the remote-procedure runtime's own: gives a call a megabyte at most, so that a count of 65535 blocks costs
-// no quarter of a gigabyte each time, and lack of memory is met often.
+// In place of the remote-procedure runtime's own: gives a call a megabyte at most, so that a count of 65535 blocks
+// costs no quarter of a gigabyte each time, and lack of memory is met often.
 
 #include <algorithm>
 #include <cstdlib>

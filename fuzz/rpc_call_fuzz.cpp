@@ -1,4 +1,5 @@
-// A remote call as the daemon carries it: label, interface, version and operation as texts and numbers, then the packet.
+// A remote call as the daemon carries it: label, interface, version and operation as texts and numbers, then the
+// packet.
 
 #include <algorithm>
 #include <cctype>
@@ -61,14 +62,15 @@ int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   const auto labelled = vmqhost::parseLabel(label);
   fuzz::require(!labelled || vmqhost::labelOf(*labelled) == label, "a label that is read is written likewise");
   const auto named = vmqhost::parseUuid(name);
-  fuzz::require(!named || textOf(*named) == inLowerCase(std::string(name)), "an identifier is the one that was written");
+  fuzz::require(!named || textOf(*named) == inLowerCase(std::string(name)),
+                "an identifier is the one that was written");
 
   const rpc__drep otherwise{(options & little) != 0 ? rpc__little_endian : rpc__big_endian,
                             (options & ebcdic) != 0 ? rpc__ebcdic : rpc__ascii};
   const std::string packet(input.rest());
   const vmqhost::RpcCall call{(options & known) != 0 ? QOR_Agent_v1_if_spec.id : named.value_or(rpc__uuid{}),
-                              (options & knownVersion) != 0 ? 1u : number, (options & knownOperation) != 0 ? 0u : number,
-                              labelled.value_or(otherwise), packet};
+                              (options & knownVersion) != 0 ? 1u : number,
+                              (options & knownOperation) != 0 ? 0u : number, labelled.value_or(otherwise), packet};
   fuzz::transfer = {packet, call.sender, number, (options & managerFails) != 0 ? 0x1c00beef : 0u};
 
   const vmqhost::RpcResult result = vmqhost::call(call);

@@ -12,6 +12,7 @@ using VMQ::String;
 
 namespace {
 
+constexpr unsigned mostSteps = 30;
 constexpr unsigned longest = 2000;
 
 class Twins {
@@ -19,7 +20,7 @@ class Twins {
   explicit Twins(fuzz::Input& input) : input_(input) {}
 
   void run() {
-    while (!input_.empty()) {
+    for (unsigned step = 0; step < mostSteps && !input_.empty(); ++step) {
       change();
       look();
       if (model_.size() > longest) clear();

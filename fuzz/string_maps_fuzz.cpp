@@ -12,6 +12,8 @@ using namespace VMQ;
 
 namespace {
 
+constexpr unsigned mostSteps = 60;
+
 /// What the map of pointers owns: the count of them that live.
 int living = 0;
 
@@ -59,7 +61,7 @@ int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     StrPtrMap pointerMap;
     pointerMap.setAutoDeleteValues(true);
     pointerMap.setFreeValueFunc(reinterpret_cast<void*>(freeValue));
-    while (!input.empty()) {
+    for (unsigned step = 0; step < mostSteps && !input.empty(); ++step) {
       const unsigned operation = input.below(8);
       const std::string key = keyFrom(input);
       const unsigned value = input.byte();

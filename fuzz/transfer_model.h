@@ -1,6 +1,6 @@
 #pragma once
-// What has to become of a packet of BinaryDataTransfer, found out by a second reading, and a manager that checks that its
-// arguments are what the packet says.
+// What has to become of a packet of BinaryDataTransfer, found out by a second reading, and a manager that checks that
+// its arguments are what the packet says.
 
 #include <cstdint>
 #include <string_view>
@@ -16,9 +16,9 @@ constexpr uint32_t memoryForCalls = 1 << 20;
 struct TransferModel {
   std::string_view packet;
   rpc__drep sender;
-  uint32_t status;          ///< what the manager answers
-  uint32_t managerFault;    ///< what it raises instead, unless 0
-  bool called = false;      ///< the manager has been
+  uint32_t status;        ///< what the manager answers
+  uint32_t managerFault;  ///< what it raises instead, unless 0
+  bool called = false;    ///< the manager has been
 };
 
 /// The call under way.

@@ -25,10 +25,11 @@ long slotOf(AgentEntry* agent) {
 
 // ---- saving ------------------------------------------------------------------------------------------------------
 
-// Appends "<tag>value</tag>" as a line. Values are not escaped; one with markup in it clears `readable`.
+// Appends "<tag>value</tag>" as a line. Values are not escaped; one with markup in it clears `readable`, and so does
+// one with a carriage return, which readers take for a line feed.
 void appendValue(std::string& text, const char* tabs, const std::string& tag, const String& value, bool& readable) {
   const std::string narrow = value.toNarrow();
-  if (narrow.find_first_of("<&") != std::string::npos) readable = false;
+  if (narrow.find_first_of("<&\r") != std::string::npos) readable = false;
   text += tabs + ("<" + tag + ">") + narrow + "</" + tag + ">\n";
 }
 

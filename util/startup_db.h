@@ -36,9 +36,9 @@ class StartupDB {
   /// Writes the model to the file, in the form above, with tabs and line feeds. Values are written as they are, in the
   /// process's code page.
   /// False, with the file untouched, when it cannot be opened for writing, or when a value would make a file that
-  /// cannot be read back ("<" or "&", or anything else the parser rejects, such as bytes that are not UTF-8). The file
-  /// is replaced in one step and keeps its mode and owner: what goes wrong once it is open (a full disk) is traced,
-  /// leaves the earlier contents whole, and, kept on purpose, still returns true.
+  /// cannot be read back ("<", "&" or a carriage return, or anything else the parser rejects, such as bytes that are
+  /// not UTF-8). The file is replaced in one step and keeps its mode and owner: what goes wrong once it is open (a full
+  /// disk) is traced, leaves the earlier contents whole, and, kept on purpose, still returns true.
   bool save() const;
 
   /// Takes ownership. Product codes may repeat; lookups find the first.

@@ -36,4 +36,19 @@ TEST(Scripts, HelpOfTheTestCommandIsWhatStandsInIt) {
   EXPECT_THAT(outcome.output, testing::HasSubstr("scripts/test [PRESET...]"));
 }
 
+TEST(Scripts, FuzzingSaysHowItIsUsedAndKnowsItsTargets) {
+  const std::string script = quoted(VMQ_SOURCE_DIR "/scripts/fuzz");
+  const Outcome help = runShell("cd / && " + script + " --help");
+  EXPECT_EQ(help.exit_code, 0);
+  EXPECT_THAT(help.output, testing::HasSubstr("scripts/fuzz SECONDS [TARGET...]"));
+  for (const char* wrong : {"", " dom_parser", " 0", " 5s"}) {
+    const Outcome outcome = runShell(script + wrong);
+    EXPECT_EQ(outcome.exit_code, 2) << wrong;
+    EXPECT_EQ(outcome.output, help.output) << wrong;
+  }
+  const Outcome unknown = runShell(script + " 5 nothing");
+  EXPECT_EQ(unknown.exit_code, 2);
+  EXPECT_EQ(unknown.output, "there is no target nothing\n");
+}
+
 }  // namespace

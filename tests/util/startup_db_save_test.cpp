@@ -218,6 +218,16 @@ TEST_F(StartupDBSaveTest, ValueThatCouldNotBeReadBackIsRefusedAndTheFileStays) {
   EXPECT_EQ(files(), 1);
 }
 
+TEST_F(StartupDBSaveTest, CarriageReturnThatWouldComeBackAsALineFeedIsRefused) {
+  const std::string contents =
+      "<runas><agent><productCode>um</productCode><instance><name>a&#13;b</name></instance></agent></runas>";
+  directory_.writeFile("runas.cfg", contents);
+  const StartupDB database = open();
+  ASSERT_EQ(database.getAgent(0U)->getInstance(0U)->getInstanceName(), "a\rb");
+  EXPECT_FALSE(database.save());
+  EXPECT_EQ(readWholeFile(path_), contents);
+}
+
 // A limit on the size of files stands for a full disk.
 TEST_F(StartupDBSaveTest, FullDiskIsTracedAndLeavesTheEarlierContentsWhole) {
   directory_.writeFile("runas.cfg", "<runas>kept</runas>");

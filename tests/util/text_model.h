@@ -1,6 +1,6 @@
 #pragma once
-// What the operations of VMQ::String do, on a plain std::u16string. What that cannot do is written out here step by step,
-// without a thought for speed.
+// What the operations of VMQ::String do, on a plain std::u16string. What that cannot do is written out here step by
+// step, without a thought for speed.
 
 #include <string>
 
