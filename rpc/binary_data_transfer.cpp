@@ -6,15 +6,16 @@
 
 #include <array>
 #include <cstdio>
-#include <memory>
 #include <string>
 #include <utility>
 
 #include "rpc/dos_to_unix.h"
 #include "util/current_exception.h"
+#include "util/stream.h"
 #include "util/trace.h"
 #include "util/util.h"
 
+using VMQ::Stream;
 using VMQ::String;
 using VMQ::Trace;
 using VMQ::Util;
@@ -39,11 +40,6 @@ constexpr int32_t firstChunk = 1;
 constexpr mode_t fileMode = 0770;
 constexpr const char* convertedNames[] = {"install.sh", "DeployLnk.sh", ".mdl"};
 
-struct CloseFile {
-  void operator()(FILE* file) const { (void)std::fclose(file); }  // the failure that led here counts
-};
-using File = std::unique_ptr<FILE, CloseFile>;
-
 String cleaned(const char* fileName) {
   String name = String::replace(String(fileName, fileNameBytes), "\\", "/");
   if (name[0] == '/') name.erase(0, 1);
@@ -65,7 +61,7 @@ bool makeDirectoryOf(const Trace& trace, const String& path) {
   return false;
 }
 
-File open(const Trace& trace, const String& path, int32_t chunkNumber) {
+Stream open(const Trace& trace, const String& path, int32_t chunkNumber) {
   const std::string name = path.toNarrow();
   const bool isFirst = chunkNumber == firstChunk;
   if (isFirst && unlink(name.c_str()) != 0) {
@@ -73,7 +69,7 @@ File open(const Trace& trace, const String& path, int32_t chunkNumber) {
                  path.c_str().get());
   }
   const char* const mode = isFirst ? "wb" : "a+b";
-  File file(std::fopen(name.c_str(), isFirst ? "wbe" : "a+be"));
+  Stream file(std::fopen(name.c_str(), isFirst ? "wbe" : "a+be"));
   if (!file) {
     TRACE_ERROR(trace, "Failed to open file %s using mode \"%s\", check permissions", path.c_str().get(), mode);
     return file;
@@ -104,7 +100,7 @@ size_t writeTogether(FILE* file, const DataBlock* blocks, int32_t count) {
 
 /// Writes the blocks and closes the file, but for the one case in which it stays open. What cannot be written together
 /// is written, and found wanting, block by block.
-Status write(const Trace& trace, const String& path, File file, const DataBlock* blocks, int32_t lastBlockIndex) {
+Status write(const Trace& trace, const String& path, Stream file, const DataBlock* blocks, int32_t lastBlockIndex) {
   for (int32_t index = 0; index <= lastBlockIndex; ++index) {
     size_t written = writeTogether(file.get(), blocks + index, lastBlockIndex - index + 1);
     while (index <= lastBlockIndex && isPossible(blocks[index]) && written >= static_cast<size_t>(blocks[index].length))
@@ -158,7 +154,7 @@ Status store(const Trace& trace, const char* fileName, int32_t chunkNumber, int3
     TRACE_ERROR(trace, "Destination path name too long, max is %d characters", longestPathTold);
     return pathTooLong;
   }
-  File file = open(trace, path, chunkNumber);
+  Stream file = open(trace, path, chunkNumber);
   if (!file) return notOpened;
   if (const Status status = write(trace, path, std::move(file), blocks, lastBlockIndex); status != stored)
     return status;

@@ -9,10 +9,13 @@
 #include <cstring>
 #include <mutex>
 #include <string>
+#include <utility>
 
+#include "util/stream.h"
 #include "util/trace.h"
 #include "util/util.h"
 
+using VMQ::Stream;
 using VMQ::String;
 using VMQ::Trace;
 using VMQ::Util;
@@ -43,11 +46,11 @@ bool isSameName(FILE* open, const std::string& name) {
 }
 
 /// A new file in place of whatever had that name: nothing that somebody has put there is written to.
-FILE* createWorkFile(const std::string& name) {
+Stream createWorkFile(const std::string& name) {
   (void)unlink(name.c_str());  // mostly there is none; what cannot be removed is in the way of the next call
   const int descriptor = open(name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, workMode);
   if (descriptor < 0) return nullptr;
-  FILE* const stream = fdopen(descriptor, "w");
+  Stream stream(fdopen(descriptor, "w"));
   if (stream == nullptr) (void)close(descriptor);  // nothing was written
   return stream;
 }
@@ -64,29 +67,29 @@ bool copyConverted(FILE* from, FILE* to) {
   return std::ferror(from) == 0;
 }
 
-bool closeStream(const Trace& trace, FILE* stream, const String& name) {
-  if (std::fclose(stream) == 0) return true;
+bool closeStream(const Trace& trace, Stream stream, const String& name) {
+  if (std::fclose(stream.release()) == 0) return true;
   TRACE_ERROR(trace, "Could not close [%s].", name.c_str().get());
   return false;
 }
 
 bool convertInto(const Trace& trace, const String& path, const String& work) {
-  FILE* const from = std::fopen(path.toNarrow().c_str(), "re");
+  Stream from(std::fopen(path.toNarrow().c_str(), "re"));
   if (from == nullptr) {
     TRACE_ERROR(trace, "Could not open [%s] for reading.", path.c_str().get());
     return false;
   }
   const std::string workName = work.toNarrow();
-  FILE* const to = isSameName(from, workName) ? nullptr : createWorkFile(workName);
+  Stream to = isSameName(from.get(), workName) ? nullptr : createWorkFile(workName);
   if (to == nullptr) {
     TRACE_ERROR(trace, "Could not open [%s] for writing.", work.c_str().get());
-    (void)closeStream(trace, from, path);
+    (void)closeStream(trace, std::move(from), path);
     return false;
   }
-  const bool copied = copyConverted(from, to);
+  const bool copied = copyConverted(from.get(), to.get());
   if (!copied) TRACE_ERROR(trace, "Could not copy [%s] to [%s].", path.c_str().get(), work.c_str().get());
-  const bool fromClosed = closeStream(trace, from, path);
-  const bool toClosed = closeStream(trace, to, work);
+  const bool fromClosed = closeStream(trace, std::move(from), path);
+  const bool toClosed = closeStream(trace, std::move(to), work);
   return copied && fromClosed && toClosed;
 }
 

@@ -6,9 +6,12 @@
 #include <cstdio>
 #include <cstring>
 #include <string>
+#include <utility>
 
+#include "util/stream.h"
 #include "util/trace.h"
 
+using VMQ::Stream;
 using VMQ::String;
 using VMQ::Trace;
 
@@ -18,9 +21,10 @@ RAS1_Unit traceUnit{"tasks/file_helpers"};
 
 constexpr size_t BLOCK_BYTES = 1024;
 
-void closeStream(const Trace& trace, FILE* stream, const String& path, bool& closed) {
-  closed = fclose(stream) == 0;
-  if (!closed) TRACE_ERROR(trace, "Failed to close stream for file %s", path.c_str().get());
+bool closeStream(const Trace& trace, Stream stream, const String& path) {
+  if (fclose(stream.release()) == 0) return true;
+  TRACE_ERROR(trace, "Failed to close stream for file %s", path.c_str().get());
+  return false;
 }
 
 bool writeAll(const Trace& trace, FILE* stream, const String& path, const std::string& bytes) {
@@ -42,7 +46,7 @@ bool writeAll(const Trace& trace, FILE* stream, const String& path, const std::s
 
 String readFile(String path) {
   const Trace trace(traceUnit);
-  FILE* stream = fopen(path.toNarrow().c_str(), "rbe");
+  Stream stream(fopen(path.toNarrow().c_str(), "rbe"));
   if (stream == nullptr) {
     TRACE_ERROR(trace, "Failed to open file %s using mode \"%s\", check permissions", path.c_str().get(), "rb");
     return String();
@@ -51,32 +55,30 @@ String readFile(String path) {
   std::string bytes;
   char block[BLOCK_BYTES];
   while (true) {
-    const size_t count = fread(block, 1, sizeof block, stream);
-    if (ferror(stream) != 0) {
-      TRACE_ERROR(trace, "Error reading from file %s, error is %d", path.c_str().get(), ferror(stream));
+    const size_t count = fread(block, 1, sizeof block, stream.get());
+    if (ferror(stream.get()) != 0) {
+      TRACE_ERROR(trace, "Error reading from file %s, error is %d", path.c_str().get(), ferror(stream.get()));
       bytes.clear();
       break;
     }
     if (count == 0) break;
     bytes.append(block, count);
-    clearerr(stream);
+    clearerr(stream.get());
   }
-  bool closed = false;
-  closeStream(trace, stream, path, closed);
+  (void)closeStream(trace, std::move(stream), path);  // what was read counts
   return String(bytes.c_str());
 }
 
 bool writeFile(const String& path, const String& text) {
   const Trace trace(traceUnit);
-  FILE* stream = fopen(path.toNarrow().c_str(), "wbe");
+  Stream stream(fopen(path.toNarrow().c_str(), "wbe"));
   if (stream == nullptr) {
     // The mode named is not the mode used: kept on purpose.
     TRACE_ERROR(trace, "Failed to open file %s using mode \"%s\", check permissions", path.c_str().get(), "rb");
     return false;
   }
-  const bool written = writeAll(trace, stream, path, text.toNarrow());
-  bool closed = false;
-  closeStream(trace, stream, path, closed);
+  const bool written = writeAll(trace, stream.get(), path, text.toNarrow());
+  const bool closed = closeStream(trace, std::move(stream), path);
   return written && closed;
 }
 

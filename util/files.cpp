@@ -11,7 +11,9 @@
 #include <new>
 #include <string>
 #include <system_error>
+#include <utility>
 
+#include "util/stream.h"
 #include "util/trace.h"
 #include "util/util.h"
 
@@ -53,21 +55,14 @@ int makeDirectory(const Trace& trace, const char* path, const char* announcement
 // ---- readFile ----------------------------------------------------------------------------------------------------
 
 /// A directory is refused: the C library opens it and reports a length of its own invention. 0, or an errno value.
-int openForReading(const char* path, FILE** stream) {
-  *stream = std::fopen(path, "rbe");
-  if (*stream == nullptr) return errno;
+int openForReading(const char* path, Stream& stream) {
+  Stream opened(std::fopen(path, "rbe"));
+  if (opened == nullptr) return errno;
   struct stat status;
-  int error = 0;
-  if (fstat(fileno(*stream), &status) != 0) {
-    error = errno;
-  } else if (S_ISDIR(status.st_mode)) {
-    error = EISDIR;
-  }
-  if (error != 0) {
-    (void)std::fclose(*stream);  // nothing was written
-    *stream = nullptr;
-  }
-  return error;
+  if (fstat(fileno(opened.get()), &status) != 0) return errno;
+  if (S_ISDIR(status.st_mode)) return EISDIR;
+  stream = std::move(opened);
+  return 0;
 }
 
 int readStream(const Trace& trace, FILE* stream, const char* path, char** contents, unsigned long* size) {
@@ -125,35 +120,36 @@ int copyStream(const Trace& trace, FILE* from, FILE* to, const String& source, c
   }
 }
 
-int closeStream(const Trace& trace, FILE* stream, const String& path) {
+int closeStream(const Trace& trace, Stream stream, const String& path) {
   errno = 0;
-  if (std::fclose(stream) == 0) return 0;
+  if (std::fclose(stream.release()) == 0) return 0;
   const int error = errorOfStream();
   TRACE_ERROR(trace, "Failed to close stream for file %s, error code: %s", path.c_str().get(), std::strerror(error));
   return error;
 }
 
 int copyOneFile(const Trace& trace, const String& source, const String& destination) {
-  FILE* from = nullptr;
-  if (const int error = openForReading(source.toNarrow().c_str(), &from); error != 0) {
+  Stream from;
+  if (const int error = openForReading(source.toNarrow().c_str(), from); error != 0) {
     TRACE_ERROR(trace, "Failed to open source file %s using mode \"%s\", check permissions, error code: %s",
                 source.c_str().get(), "rb", std::strerror(error));
     return error;
   }
   const std::string to_path = destination.toNarrow();
   // Opening the destination would empty the source.
-  if (isSameFile(from, to_path)) return closeStream(trace, from, source);
+  if (isSameFile(from.get(), to_path)) return closeStream(trace, std::move(from), source);
 
-  FILE* const to = std::fopen(to_path.c_str(), "wbe");
+  Stream to(std::fopen(to_path.c_str(), "wbe"));
   if (to == nullptr) {
     const int error = errno;
     TRACE_ERROR(trace, "Failed to open destination file %s using mode \"%s\", check permissions, error code: %s",
                 destination.c_str().get(), "wb", std::strerror(error));
-    (void)closeStream(trace, from, source);  // the first error counts
+    (void)closeStream(trace, std::move(from), source);  // the first error counts
     return error;
   }
-  int rc = copyStream(trace, from, to, source, destination);
-  for (const int closed : {closeStream(trace, from, source), closeStream(trace, to, destination)}) {
+  int rc = copyStream(trace, from.get(), to.get(), source, destination);
+  for (const int closed :
+       {closeStream(trace, std::move(from), source), closeStream(trace, std::move(to), destination)}) {
     if (rc == 0) rc = closed;
   }
   return rc;
@@ -197,11 +193,9 @@ int Util::readFile(const char* path, char** contents, unsigned long* size) {
   const Trace trace(traceUnit);
   *contents = nullptr;
   if (size != nullptr) *size = 0;
-  FILE* stream = nullptr;
-  if (const int error = openForReading(path, &stream); error != 0) return error;
-  const int error = readStream(trace, stream, path, contents, size);
-  (void)std::fclose(stream);  // nothing was written
-  return error;
+  Stream stream;
+  if (const int error = openForReading(path, stream); error != 0) return error;
+  return readStream(trace, stream.get(), path, contents, size);
 }
 
 bool Util::deleteFile(const String& path) {

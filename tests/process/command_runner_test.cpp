@@ -10,7 +10,7 @@
 
 #include "test_seam.h"
 #include "tests/process/command_fixture.h"
-#include "tests/process/system_faults.h"
+#include "tests/support/system_faults.h"
 
 namespace {
 

@@ -8,7 +8,7 @@
 #include "bss1.h"
 #include "test_seam.h"
 #include "tests/process/command_fixture.h"
-#include "tests/process/system_faults.h"
+#include "tests/support/system_faults.h"
 
 namespace {
 

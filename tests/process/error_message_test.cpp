@@ -7,7 +7,7 @@
 #include <memory>
 #include <string>
 
-#include "tests/process/system_faults.h"
+#include "tests/support/system_faults.h"
 
 namespace {
 

@@ -25,7 +25,7 @@ FakeAccounts::~FakeAccounts() {
   delete std::exchange(accounts, nullptr);
 }
 
-#pragma GCC visibility push(default)  // as in tests/process/system_faults.cpp
+#pragma GCC visibility push(default)  // as in tests/support/system_faults.cpp
 extern "C" {
 
 int __real_getpwnam_r(const char* name, passwd* entry, char* buffer, size_t size, passwd** result);

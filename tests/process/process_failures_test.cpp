@@ -7,7 +7,7 @@
 
 #include "test_seam.h"
 #include "tests/process/child_fixture.h"
-#include "tests/process/system_faults.h"
+#include "tests/support/system_faults.h"
 
 namespace {
 

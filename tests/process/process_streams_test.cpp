@@ -9,7 +9,7 @@
 
 #include "process/pipes.h"
 #include "test_seam.h"
-#include "tests/process/system_faults.h"
+#include "tests/support/system_faults.h"
 #include "tests/support/nothing_left_behind.h"
 
 namespace {

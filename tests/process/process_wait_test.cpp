@@ -14,7 +14,7 @@
 
 #include "test_seam.h"
 #include "tests/process/child_fixture.h"
-#include "tests/process/system_faults.h"
+#include "tests/support/system_faults.h"
 
 namespace {
 
@@ -209,7 +209,6 @@ TEST_F(ProcessWait, ChildThatCannotBeReapedGives255) {
   }
   EXPECT_TRUE(traces.hasPrefix(RAS1_DETAIL, "waitpid returned rc=-1,waitstat="));
   EXPECT_TRUE(traces.has(RAS1_ERROR, "Error occurred. ERRNO:10 No child processes"));
-  EXPECT_GT(waitpid(-1, nullptr, 0), 0);  // it is still there
 }
 
 TEST_F(ProcessWait, MutexThatCannotBeTakenMeansNoWaiting) {

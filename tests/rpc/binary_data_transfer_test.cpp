@@ -11,7 +11,7 @@
 #include <filesystem>
 #include <thread>
 
-#include "tests/rpc/failing_files.h"
+#include "tests/support/system_faults.h"
 #include "tests/rpc/transfer_fixture.h"
 #include "tests/support/failing_allocation.h"
 #include "tests/support/process_resources.h"
@@ -277,7 +277,7 @@ TEST_F(BinaryDataTransferTest, FullFileSystemIsAFailureThatKeepsWhatWasWritten) 
 
 TEST_F(BinaryDataTransferTest, PartThatTheSystemDidNotTakeIsWrittenAfterIt) {
   for (const int chunk : {1, 2}) {
-    const FailingFile writesHalf(FileCall::kWritev, 0);
+    const SystemFault writesHalf(SystemCall::kWritev, EIO);
     EXPECT_EQ(transfer("file", chunk, {"abcdef", "", "gh", "i"}), 0u);
     EXPECT_TRUE(writesHalf.happened());
   }
@@ -330,20 +330,20 @@ TEST_F(BinaryDataTransferTest, BlockOfAnImpossibleLengthIsNotWrittenAndTheFileIs
 }
 
 TEST_F(BinaryDataTransferTest, FailedCloseIsAFailure) {
-  const FailingFile failing(FileCall::kFclose, EIO);
+  const SystemFault failing(SystemCall::kFclose, EIO);
   EXPECT_EQ(transfer("x.mdl", 1, {"a"}), 5u);
   EXPECT_THAT(trace_.texts(RAS1_ERROR), ElementsAre("Could not close [" + depot_ + "x.mdl]."));
 }
 
 TEST_F(BinaryDataTransferTest, FailedPermissionsAreOnlyTraced) {
-  const FailingFile failing(FileCall::kChmod, EPERM);
+  const SystemFault failing(SystemCall::kChmod, EPERM);
   EXPECT_EQ(transfer("file", 1, {"a"}), 0u);
   EXPECT_THAT(trace_.texts(RAS1_ERROR), ElementsAre("Failed to set permissions on file [" + depot_ + "file] to [504]"));
 }
 
 TEST_F(BinaryDataTransferTest, FileThatCannotBeRemovedIsEmptied) {
   directory_.writeFile("depot/file", "old contents");
-  const FailingFile failing(FileCall::kUnlink, EPERM);
+  const SystemFault failing(SystemCall::kUnlink, EPERM);
   EXPECT_EQ(transfer("file", 1, {"new"}), 0u);
   EXPECT_EQ(readWholeFile(depot_ + "file"), "new");
   EXPECT_TRUE(trace_.has(RAS1_DETAIL, "Failed to unlink file [" + depot_ +

@@ -9,7 +9,7 @@
 #include <filesystem>
 #include <thread>
 
-#include "tests/rpc/failing_files.h"
+#include "tests/support/system_faults.h"
 #include "tests/rpc/transfer_fixture.h"
 #include "tests/support/process_resources.h"
 #include "tests/support/scratch_file_system.h"
@@ -132,7 +132,7 @@ TEST_F(ConvertDos2UnixTest, OldWorkFileThatCannotBeRemovedIsNotWrittenToEither) 
     fs::remove(work_file_);
     symbolic ? fs::create_symlink(kept, work_file_) : fs::create_hard_link(kept, work_file_);
     trace_.clear();
-    const FailingFile failing(FileCall::kUnlink, EPERM);
+    const SystemFault failing(SystemCall::kUnlink, EPERM);
     EXPECT_EQ(convertDOS2Unix(path.c_str()), -1);
     EXPECT_THAT(trace_.texts(RAS1_ERROR), ElementsAre("Could not open [" + work_file_ + "] for writing."));
     EXPECT_EQ(readWholeFile(kept), "precious");
@@ -165,7 +165,7 @@ TEST_F(ConvertDos2UnixTest, MissingFile) {
 TEST_F(ConvertDos2UnixTest, HomeWithoutADirectoryForTheWorkFile) {
   const std::string path = newScript();
   fs::remove_all(home_ + "/tmp");
-  const FailingFile failing(FileCall::kFclose, EIO);
+  const SystemFault failing(SystemCall::kFclose, EIO);
   EXPECT_EQ(convertDOS2Unix(path.c_str()), -1);
   EXPECT_THAT(trace_.texts(RAS1_ERROR),
               ElementsAre("Could not open [" + work_file_ + "] for writing.", "Could not close [" + path + "]."));
@@ -197,13 +197,13 @@ TEST_F(ConvertDos2UnixTest, WorkFileThatCannotBeWrittenLeavesTheFileAsItWas) {
 TEST_F(ConvertDos2UnixTest, FailedCloseOfEitherFileLeavesTheFileAsItWas) {
   const std::string path = newScript();
   {
-    const FailingFile failing(FileCall::kFclose, EIO);
+    const SystemFault failing(SystemCall::kFclose, EIO);
     EXPECT_EQ(convertDOS2Unix(path.c_str()), -1);
     EXPECT_THAT(trace_.texts(RAS1_ERROR), ElementsAre("Could not close [" + path + "]."));
   }
   trace_.clear();
   {
-    const FailingFile failing(FileCall::kFclose, EIO, 2);
+    const SystemFault failing(SystemCall::kFclose, EIO, 2);
     EXPECT_EQ(convertDOS2Unix(path.c_str()), -1);
     EXPECT_THAT(trace_.texts(RAS1_ERROR), ElementsAre("Could not close [" + work_file_ + "]."));
   }
@@ -212,7 +212,7 @@ TEST_F(ConvertDos2UnixTest, FailedCloseOfEitherFileLeavesTheFileAsItWas) {
 
 TEST_F(ConvertDos2UnixTest, FailedPermissionsLeaveTheFileAsItWasAndTheWorkFile) {
   const std::string path = newScript();
-  const FailingFile failing(FileCall::kChmod, EPERM);
+  const SystemFault failing(SystemCall::kChmod, EPERM);
   EXPECT_EQ(convertDOS2Unix(path.c_str()), -1);
   EXPECT_THAT(trace_.texts(RAS1_ERROR), ElementsAre("Failed to set permissions on file [" + work_file_ + "] to [504]"));
   EXPECT_EQ(readWholeFile(path), "line\r\n");
@@ -221,7 +221,7 @@ TEST_F(ConvertDos2UnixTest, FailedPermissionsLeaveTheFileAsItWasAndTheWorkFile) 
 
 TEST_F(ConvertDos2UnixTest, FileThatCannotBeRemovedStaysAsItWas) {
   const std::string path = newScript();
-  const FailingFile failing(FileCall::kUnlink, EPERM, /*nth=*/2);  // the first is that of an old work file
+  const SystemFault failing(SystemCall::kUnlink, EPERM, /*nth=*/2);  // the first is that of an old work file
   EXPECT_EQ(convertDOS2Unix(path.c_str()), -1);
   EXPECT_THAT(trace_.texts(RAS1_ERROR), ElementsAre("Failed to unlink file [" + path + "]. " + onError(EPERM)));
   EXPECT_EQ(readWholeFile(path), "line\r\n");
@@ -229,7 +229,7 @@ TEST_F(ConvertDos2UnixTest, FileThatCannotBeRemovedStaysAsItWas) {
 
 TEST_F(ConvertDos2UnixTest, AfterAFailedLinkTheContentsAreInTheWorkFileOnly) {
   const std::string path = newScript();
-  const FailingFile failing(FileCall::kLink, EMLINK);
+  const SystemFault failing(SystemCall::kLink, EMLINK);
   EXPECT_EQ(convertDOS2Unix(path.c_str()), -1);
   EXPECT_THAT(trace_.texts(RAS1_ERROR),
               ElementsAre("Failed to link file [" + work_file_ + "] to [" + path + "]. " + onError(EMLINK)));
@@ -250,7 +250,7 @@ TEST_F(ConvertDos2UnixTest, FileOnAnotherFileSystemCannotBeLinked) {
 TEST_F(ConvertDos2UnixTest, WorkFileThatCannotBeRemovedIsAFailureOfAConvertedFile) {
   const std::string path = newScript();
   {
-    const FailingFile failing(FileCall::kUnlink, EPERM, /*nth=*/3);
+    const SystemFault failing(SystemCall::kUnlink, EPERM, /*nth=*/3);
     EXPECT_EQ(convertDOS2Unix(path.c_str()), -1);
   }
   EXPECT_THAT(trace_.texts(RAS1_ERROR),

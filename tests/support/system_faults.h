@@ -1,6 +1,6 @@
 #pragma once
-// Makes system functions fail when the component calls them. The test program is linked so that the calls in its own
-// objects come here first; the host library and the C library are not affected.
+// Makes system functions fail when the component calls them. A test program that links vmq_system_faults has the calls
+// in its own objects come here first; the host library and the C library are not affected.
 
 #include <sys/types.h>
 
@@ -20,15 +20,35 @@ enum class SystemCall {
   kPthreadCondSignal,   ///< it is signalled all the same
   kKill,
   kWaitid,
-  kWaitpid,
+  kWaitpid,  ///< with ECHILD the child is gone all the same, as when the host has reaped it
   kPoll,
   kRead,
   kWrite,
+  kWritev,  ///< it does not fail, but writes only half of its first piece, as the system may
   kFcntl,
-  kStrdup,
   kTimedWait,  ///< BSS1_TimedWait
-  kDup3,       ///< these two between clone and exec
+  kDup3,       ///< these three between clone and exec
   kCloseRange,
+  kExecve,
+  // Files and directories.
+  kAccess,
+  kStat,  ///< lstat and fstat too
+  kMkdir,
+  kChmod,
+  kUnlink,
+  kLink,
+  kUname,
+  kOpen,
+  kClose,  ///< it is closed all the same; so is a stream
+  kFopen,
+  kFdopen,
+  kFseek,
+  kFtell,
+  kFread,   ///< reading a character too. The error is EISDIR
+  kFwrite,  ///< writing a character and flushing too. The error is ENOSPC
+  kFclose,
+  kAllocate,  ///< operator new throws; malloc, calloc and realloc give a null pointer
+  kStrdup,
   kCount
 };
 
@@ -44,6 +64,15 @@ class SystemFault {
 
  private:
   const SystemCall call_;
+};
+
+/// While it lives, calls of this thread neither fail nor count: those of the test itself.
+class SparedThread {
+ public:
+  SparedThread();
+  ~SparedThread();
+  SparedThread(const SparedThread&) = delete;
+  SparedThread& operator=(const SparedThread&) = delete;
 };
 
 /// Every kill of the component while it lives: target and signal, in order.

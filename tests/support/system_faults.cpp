@@ -1,4 +1,4 @@
-#include "tests/process/system_faults.h"
+#include "tests/support/system_faults.h"
 
 #include <fcntl.h>
 #include <poll.h>
@@ -7,7 +7,10 @@
 #include <signal.h>
 #include <sys/eventfd.h>
 #include <sys/mman.h>
+#include <sys/stat.h>
 #include <sys/syscall.h>
+#include <sys/uio.h>
+#include <sys/utsname.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -15,9 +18,12 @@
 #include <cerrno>
 #include <cstdarg>
 #include <cstdint>
+#include <cstdio>
+#include <cstdlib>
 #include <mutex>
+#include <new>
 
-// The faults of dup3 and close_range strike in a child that shares our memory: see process/child_entry.cpp.
+// The faults of dup3, close_range and execve strike in a child that shares our memory: see process/child_entry.cpp.
 #if defined(__clang__)
 #define CHILD_CODE __attribute__((disable_sanitizer_instrumentation))
 #else
@@ -33,11 +39,12 @@ struct Plan {
   int calls = 0;
 };
 Plan plans[static_cast<int>(SystemCall::kCount)];
+constinit thread_local bool spared = false;
 
 /// The error of this call, or 0 when it is not to fail.
 CHILD_CODE int strike(SystemCall call) {
   Plan& plan = plans[static_cast<int>(call)];
-  if (__atomic_load_n(&plan.end, __ATOMIC_ACQUIRE) == 0) return 0;
+  if (__atomic_load_n(&plan.end, __ATOMIC_ACQUIRE) == 0 || spared) return 0;
   const int number = __atomic_add_fetch(&plan.calls, 1, __ATOMIC_ACQ_REL);
   return number >= plan.first && number < plan.end ? plan.error : 0;
 }
@@ -49,6 +56,47 @@ Result orErrno(SystemCall call, Result failure, Real real) {
   if (error == 0) return real();
   errno = error;
   return failure;
+}
+
+/// What has happened all the same when it is told to have failed.
+template <typename Result>
+Result failAfterwards(SystemCall call, Result failure, Result result) {
+  const int error = strike(call);
+  if (error == 0) return result;
+  errno = error;
+  return failure;
+}
+
+/// What a stream does while its descriptor leads elsewhere: the C library then finds and remembers a true error.
+template <typename Real>
+auto onBrokenStream(FILE* stream, const char* elsewhere, int flags, Real real) {
+  const int descriptor = fileno(stream);
+  const int kept = dup(descriptor);
+  const int broken = open(elsewhere, flags | O_CLOEXEC);
+  (void)dup2(broken, descriptor);
+  const auto result = real();
+  const int error = errno;
+  (void)dup2(kept, descriptor);
+  for (const int extra : {kept, broken}) (void)close(extra);
+  errno = error;
+  return result;
+}
+
+/// Reading, which finds a directory.
+template <typename Real>
+auto orUnreadable(FILE* stream, Real real) {
+  return strike(SystemCall::kFread) == 0 ? real() : onBrokenStream(stream, "/", O_RDONLY | O_DIRECTORY, real);
+}
+
+/// Writing, which finds a full device.
+template <typename Real>
+auto orFull(FILE* stream, Real real) {
+  if (stream == nullptr || strike(SystemCall::kFwrite) == 0) return real();
+  return onBrokenStream(stream, "/dev/full", O_WRONLY, [&] {
+    const auto result = real();
+    (void)fflush(stream);
+    return result;
+  });
 }
 
 std::atomic<pthread_mutex_t*> lastMutex;
@@ -73,6 +121,14 @@ SystemFault::~SystemFault() {
 bool SystemFault::happened() const {
   const Plan& plan = plans[static_cast<int>(call_)];
   return __atomic_load_n(&plan.calls, __ATOMIC_ACQUIRE) >= plan.first;
+}
+
+SparedThread::SparedThread() {
+  spared = true;
+}
+
+SparedThread::~SparedThread() {
+  spared = false;
 }
 
 KillRecord::KillRecord() {
@@ -167,7 +223,12 @@ WRAP(int, waitid, idtype_t type, id_t id, siginfo_t* info, int options) {
 }
 
 WRAP(pid_t, waitpid, pid_t pid, int* status, int options) {
-  return orErrno(SystemCall::kWaitpid, -1, [&] { return __real_waitpid(pid, status, options); });
+  const int error = strike(SystemCall::kWaitpid);
+  if (error == 0) return __real_waitpid(pid, status, options);
+  int lost = 0;
+  if (error == ECHILD) (void)__real_waitpid(pid, &lost, options);
+  errno = error;
+  return -1;
 }
 
 WRAP(int, poll, pollfd* events, nfds_t count, int timeout) {
@@ -182,6 +243,11 @@ WRAP(ssize_t, write, int descriptor, const void* buffer, size_t length) {
   return orErrno(SystemCall::kWrite, ssize_t{-1}, [&] { return __real_write(descriptor, buffer, length); });
 }
 
+WRAP(ssize_t, writev, int descriptor, const iovec* pieces, int count) {
+  if (strike(SystemCall::kWritev) == 0) return __real_writev(descriptor, pieces, count);
+  return __real_write(descriptor, pieces->iov_base, pieces->iov_len / 2);
+}
+
 WRAP(int, fcntl, int descriptor, int command, ...) {
   va_list arguments;
   va_start(arguments, command);
@@ -189,6 +255,128 @@ WRAP(int, fcntl, int descriptor, int command, ...) {
   va_end(arguments);
   if (command == F_SETPIPE_SZ) return __real_fcntl(descriptor, command, argument);  // a wish, which may fail unseen
   return orErrno(SystemCall::kFcntl, -1, [&] { return __real_fcntl(descriptor, command, argument); });
+}
+
+// ---- files and directories ----------------------------------------------------------------------------------------
+
+WRAP(int, access, const char* path, int mode) {
+  return orErrno(SystemCall::kAccess, -1, [&] { return __real_access(path, mode); });
+}
+
+WRAP(int, stat, const char* path, struct stat* status) {
+  return orErrno(SystemCall::kStat, -1, [&] { return __real_stat(path, status); });
+}
+
+WRAP(int, lstat, const char* path, struct stat* status) {
+  return orErrno(SystemCall::kStat, -1, [&] { return __real_lstat(path, status); });
+}
+
+WRAP(int, fstat, int descriptor, struct stat* status) {
+  return orErrno(SystemCall::kStat, -1, [&] { return __real_fstat(descriptor, status); });
+}
+
+WRAP(int, mkdir, const char* path, mode_t mode) {
+  return orErrno(SystemCall::kMkdir, -1, [&] { return __real_mkdir(path, mode); });
+}
+
+WRAP(int, chmod, const char* path, mode_t mode) {
+  return orErrno(SystemCall::kChmod, -1, [&] { return __real_chmod(path, mode); });
+}
+
+WRAP(int, unlink, const char* path) {
+  return orErrno(SystemCall::kUnlink, -1, [&] { return __real_unlink(path); });
+}
+
+WRAP(int, link, const char* from, const char* to) {
+  return orErrno(SystemCall::kLink, -1, [&] { return __real_link(from, to); });
+}
+
+WRAP(int, uname, utsname* names) {
+  return orErrno(SystemCall::kUname, -1, [&] { return __real_uname(names); });
+}
+
+WRAP(int, open, const char* path, int flags, ...) {
+  va_list arguments;
+  va_start(arguments, flags);
+  const mode_t mode = (flags & O_CREAT) != 0 ? va_arg(arguments, mode_t) : 0;
+  va_end(arguments);
+  return orErrno(SystemCall::kOpen, -1, [&] { return __real_open(path, flags, mode); });
+}
+
+WRAP(int, close, int descriptor) {
+  return failAfterwards(SystemCall::kClose, -1, __real_close(descriptor));
+}
+
+WRAP(FILE*, fopen, const char* path, const char* mode) {
+  return orErrno(SystemCall::kFopen, static_cast<FILE*>(nullptr), [&] { return __real_fopen(path, mode); });
+}
+
+WRAP(FILE*, fdopen, int descriptor, const char* mode) {
+  return orErrno(SystemCall::kFdopen, static_cast<FILE*>(nullptr), [&] { return __real_fdopen(descriptor, mode); });
+}
+
+WRAP(int, fseek, FILE* stream, long offset, int from) {
+  return orErrno(SystemCall::kFseek, -1, [&] { return __real_fseek(stream, offset, from); });
+}
+
+WRAP(long, ftell, FILE* stream) {
+  return orErrno(SystemCall::kFtell, -1L, [&] { return __real_ftell(stream); });
+}
+
+WRAP(size_t, fread, void* buffer, size_t size, size_t count, FILE* stream) {
+  return orUnreadable(stream, [&] { return __real_fread(buffer, size, count, stream); });
+}
+
+WRAP(int, getc_unlocked, FILE* stream) {
+  return orUnreadable(stream, [&] { return __real_getc_unlocked(stream); });
+}
+
+WRAP(size_t, fwrite, const void* data, size_t size, size_t count, FILE* stream) {
+  return orFull(stream, [&] { return __real_fwrite(data, size, count, stream); });
+}
+
+WRAP(int, putc_unlocked, int character, FILE* stream) {
+  const int put = orFull(stream, [&] { return __real_putc_unlocked(character, stream); });
+  return ferror(stream) != 0 ? EOF : put;
+}
+
+WRAP(int, fflush, FILE* stream) {
+  return orFull(stream, [&] { return __real_fflush(stream); });
+}
+
+WRAP(int, fclose, FILE* stream) {
+  return failAfterwards(SystemCall::kFclose, EOF, __real_fclose(stream));
+}
+
+// ---- memory -------------------------------------------------------------------------------------------------------
+
+WRAP(void*, malloc, size_t bytes) {
+  return orErrno(SystemCall::kAllocate, static_cast<void*>(nullptr), [&] { return __real_malloc(bytes); });
+}
+
+WRAP(void*, calloc, size_t count, size_t bytes) {
+  return orErrno(SystemCall::kAllocate, static_cast<void*>(nullptr), [&] { return __real_calloc(count, bytes); });
+}
+
+WRAP(void*, realloc, void* block, size_t bytes) {
+  return orErrno(SystemCall::kAllocate, static_cast<void*>(nullptr), [&] { return __real_realloc(block, bytes); });
+}
+
+// The names of operator new and new[], those that throw and those that do not.
+WRAP(void*, _Znwm, size_t bytes) {
+  return strike(SystemCall::kAllocate) == 0 ? __real__Znwm(bytes) : throw std::bad_alloc();
+}
+
+WRAP(void*, _Znam, size_t bytes) {
+  return strike(SystemCall::kAllocate) == 0 ? __real__Znam(bytes) : throw std::bad_alloc();
+}
+
+WRAP(void*, _ZnwmRKSt9nothrow_t, size_t bytes, const std::nothrow_t& nothrow) {
+  return strike(SystemCall::kAllocate) == 0 ? __real__ZnwmRKSt9nothrow_t(bytes, nothrow) : nullptr;
+}
+
+WRAP(void*, _ZnamRKSt9nothrow_t, size_t bytes, const std::nothrow_t& nothrow) {
+  return strike(SystemCall::kAllocate) == 0 ? __real__ZnamRKSt9nothrow_t(bytes, nothrow) : nullptr;
 }
 
 WRAP(char*, strdup, const char* text) {
@@ -209,6 +397,7 @@ CHILD_CODE long __wrap_syscall(long number, ...) {
   va_end(arguments);
   const int error = number == SYS_dup3          ? strike(SystemCall::kDup3)
                     : number == SYS_close_range ? strike(SystemCall::kCloseRange)
+                    : number == SYS_execve      ? strike(SystemCall::kExecve)
                                                 : 0;
   if (error == 0) return __real_syscall(number, a[0], a[1], a[2], a[3], a[4], a[5]);
   errno = error;
