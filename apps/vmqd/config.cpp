@@ -66,6 +66,8 @@ constexpr Key keys[] = {
      "packets of all clients together; calls beyond it are told to wait (33554432)"},
     {"maximum_connections", "", [](auto& c, auto v) { c.maximum_connections = number(v, 4, 10000); },
      "clients at a time; at most three quarters of them may watch (256)"},
+    {"client_seconds", "", [](auto& c, auto v) { c.client_seconds = number(v, 1, 24 * 3600); },
+     "how long a client may take for its next request, and for reading its reply (60)"},
     {"stop_seconds", "", [](auto& c, auto v) { c.stop_seconds = number(v, 0, 3600); },
      "how long a stop waits for queries that still run (5)"},
 };

@@ -25,6 +25,7 @@ struct Configuration {
   unsigned maximum_packet_bytes = 4 << 20;
   unsigned packet_memory_bytes = 32 << 20;
   unsigned maximum_connections = 256;
+  unsigned client_seconds = 60;
   unsigned stop_seconds = 5;
 
   /// Where each key of the file stands, "FILE:LINE: KEY", for what turns out to be wrong later.

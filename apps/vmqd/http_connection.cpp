@@ -32,6 +32,11 @@ void freeStream(void* stream) {
   delete static_cast<ReplyStream*>(stream);
 }
 
+int descriptorOf(MHD_Connection* connection) {
+  const auto* const info = MHD_get_connection_info(connection, MHD_CONNECTION_INFO_CONNECTION_FD);
+  return info == nullptr ? -1 : info->connect_fd;
+}
+
 Response newResponse(Reply& reply) {
   if (!reply.stream) {
     // The text stays where it is until the reply has been sent.
@@ -64,11 +69,12 @@ void trim(std::string& buffer) {
 }  // namespace
 
 HttpConnection::HttpConnection(HttpServer& server, MHD_Connection* connection)
-    : server_(server), connection_(connection) {
+    : server_(server),
+      connection_(connection),
+      descriptor_(descriptorOf(connection)),
+      deadline_(server.deadlines_, descriptor_) {
   server_.connections_.begin();
   one_too_many_ = server_.connections_.count() > server_.limits_.maximum_connections;
-  const auto* const info = MHD_get_connection_info(connection_, MHD_CONNECTION_INFO_CONNECTION_FD);
-  if (info != nullptr) descriptor_ = info->connect_fd;
   const auto peer = peerOf(descriptor_);
   admitted_ = peer && server_.users_.admits(peer->uid);
   if (!peer) {
@@ -76,6 +82,7 @@ HttpConnection::HttpConnection(HttpServer& server, MHD_Connection* connection)
   } else if (!admitted_) {
     logWarning("refused the user " + std::to_string(peer->uid) + ", process " + std::to_string(peer->pid));
   }
+  deadline_.await();
 }
 
 HttpConnection::~HttpConnection() {
@@ -123,6 +130,7 @@ MHD_Result HttpConnection::takeBody(const char* piece, size_t bytes) {
 }
 
 MHD_Result HttpConnection::answer(const char* method, const char* path) {
+  deadline_.proceed();
   if (body_bytes_ > maximum_bytes_) return bodyTooLarge();
   Request request{method, path, {}, {}, body_, headerValue("Data-Representation"), descriptor_};
   (void)MHD_get_connection_values_n(connection_, MHD_GET_ARGUMENT_KIND, collectArgument, &request.arguments);
@@ -153,6 +161,7 @@ void HttpConnection::end() {
   trim(body_);
   trim(reply_);
   if (std::exchange(unfinished_, false)) server_.unfinished_.end();
+  deadline_.await();
 }
 
 MHD_Result HttpConnection::bodyTooLarge() {
@@ -169,6 +178,7 @@ MHD_Result HttpConnection::refuseNow(const ErrorCode& code, const std::string& s
 MHD_Result HttpConnection::send(Reply& reply, bool last) {
   const unsigned status = reply.status;
   const bool is_stream = reply.stream != nullptr;
+  if (!is_stream) deadline_.await();  // a watcher may read as slowly as it likes, and loses rows
   const Response response = newResponse(reply);
   if (!response ||
       !addHeader(response, MHD_HTTP_HEADER_CONTENT_TYPE, is_stream ? "text/event-stream" : reply.content_type) ||

@@ -37,7 +37,8 @@ class HttpConnection {
 
   HttpServer& server_;
   MHD_Connection* const connection_;
-  int descriptor_ = -1;
+  const int descriptor_;
+  ClientDeadlines::Client deadline_;
   bool admitted_ = false;
   bool one_too_many_ = false;
   bool unfinished_ = false;

@@ -9,6 +9,7 @@
 #include <memory>
 
 #include "apps/vmqd/activity.h"
+#include "apps/vmqd/client_deadlines.h"
 #include "apps/vmqd/listening_socket.h"
 #include "apps/vmqd/packet_memory.h"
 #include "apps/vmqd/peer_credentials.h"
@@ -25,6 +26,7 @@ struct HttpLimits {
   unsigned maximum_packet_bytes;
   unsigned packet_memory_bytes;
   unsigned maximum_connections;
+  unsigned client_seconds;
 };
 
 class HttpServer {
@@ -58,6 +60,7 @@ class HttpServer {
   const Answer answer_;
   std::atomic<bool> stopping_{false};
   PacketMemory packet_memory_{limits_.packet_memory_bytes};
+  ClientDeadlines deadlines_{std::chrono::seconds(limits_.client_seconds)};
   Activity connections_;
   Activity working_;     // in answer_
   Activity unfinished_;  // from answer_ until the reply has been sent

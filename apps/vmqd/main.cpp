@@ -128,10 +128,11 @@ int run(const Configuration& configuration) {
   Service service(settings, vmqhost::listTables());
   warn(service);
   warnOfTooFewDescriptors(configuration.maximum_connections);
-  HttpServer server(socket, AdmittedUsers(configuration.allowed_uids),
-                    {configuration.maximum_request_bytes, configuration.maximum_packet_bytes,
-                     configuration.packet_memory_bytes, configuration.maximum_connections},
-                    carriesPacket, [&service](Request& request, Reply& reply) { answer(service, request, reply); });
+  HttpServer server(
+      socket, AdmittedUsers(configuration.allowed_uids),
+      {configuration.maximum_request_bytes, configuration.maximum_packet_bytes, configuration.packet_memory_bytes,
+       configuration.maximum_connections, configuration.client_seconds},
+      carriesPacket, [&service](Request& request, Reply& reply) { answer(service, request, reply); });
   logLine("version " VMQ_VERSION " listening on " + socket.path());
   tell(manager, "READY=1");
 

@@ -41,6 +41,7 @@ TEST(Configuration, OnlyTheHomeIsRequired) {
   EXPECT_EQ(4194304u, configuration.maximum_packet_bytes);
   EXPECT_EQ(33554432u, configuration.packet_memory_bytes);
   EXPECT_EQ(256u, configuration.maximum_connections);
+  EXPECT_EQ(60u, configuration.client_seconds);
   EXPECT_EQ(5u, configuration.stop_seconds);
   EXPECT_THAT(configuration.allowed_uids, ElementsAre());
   EXPECT_THAT(configuration.variables, ElementsAre(Pair("CORVELHOME", "/tmp")));
@@ -61,6 +62,7 @@ TEST(Configuration, EveryKeyHasItsPlace) {
       "maximum_packet_bytes = 8192\n"
       "packet_memory_bytes = 2147483648\n"
       "maximum_connections = 4\n"
+      "client_seconds = 86400\n"
       "stop_seconds = 0\n"
       "environment.JAVA_HOME = /usr/lib/jvm = x\n"
       "environment.EMPTY =\n");
@@ -73,6 +75,7 @@ TEST(Configuration, EveryKeyHasItsPlace) {
   EXPECT_EQ(8192u, configuration.maximum_packet_bytes);
   EXPECT_EQ(2147483648u, configuration.packet_memory_bytes);
   EXPECT_EQ(4u, configuration.maximum_connections);
+  EXPECT_EQ(86400u, configuration.client_seconds);
   EXPECT_EQ(0u, configuration.stop_seconds);
   EXPECT_THAT(configuration.variables,
               ElementsAre(Pair("CORVELHOME", "/tmp"), Pair("QORDEPLOY_AGENTDEPOT", "/d"),
