@@ -1,0 +1,19 @@
+#pragma once
+// What a process takes.
+
+#include <sys/types.h>
+
+#include <vector>
+
+struct Footprint {
+  double requests = 0;  ///< that it has answered until then
+  long resident_kib = 0;
+  unsigned threads = 0;
+  unsigned descriptors = 0;
+  unsigned children = 0;
+
+  static Footprint of(pid_t process);
+};
+
+/// The slope of the straight line that fits the resident memory best, in KiB for 1000 requests.
+double memorySlope(const std::vector<Footprint>& footprints);
