@@ -26,11 +26,14 @@ int exitCodeOf(int waitStatus) {
 }
 
 /// Returns when the child has ended, without reaping it: until the mutex is held its pid must stay its own, because
-/// Process::wait may be about to kill it.
-void waitForEnd(pid_t pid) {
+/// Process::wait may be about to kill it. False when the system does not let us wait so.
+bool waitForEnd(pid_t pid) {
   siginfo_t info;
-  while (waitid(P_PID, static_cast<id_t>(pid), &info, WEXITED | WNOWAIT) != 0 && errno == EINTR) {
-  }
+  int rc;
+  do {
+    rc = waitid(P_PID, static_cast<id_t>(pid), &info, WEXITED | WNOWAIT);
+  } while (rc != 0 && errno == EINTR);
+  return rc == 0;
 }
 
 int reap(const Trace& trace, pid_t pid) {
@@ -88,11 +91,13 @@ void* ProcTerminateThreadFunc(void* argument) {
   ProcessData* const pd = handle->get();
 
   TRACE_DETAIL(trace, "Waiting for process id: %d", pd->pid);
-  waitForEnd(pd->pid);
+  const bool ended = waitForEnd(pd->pid);
+  // A child may run for as long as it likes, and wait for its input: not with the mutex held, which running() takes.
+  const int early = ended ? kNotReaped : reap(trace, pd->pid);
 
   const int lockError = pthread_mutex_lock(&pd->mutex);
   if (lockError != 0) TRACE_ERROR(trace, "pthread_mutex_lock error=%d", lockError);
-  pd->retCode = reap(trace, pd->pid);
+  pd->retCode = ended ? reap(trace, pd->pid) : early;
   pd->completed = true;
   TRACE_DETAIL(trace, "Signaling pd->wait_cond");
   int rc = pthread_cond_signal(&pd->wait_cond);

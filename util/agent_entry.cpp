@@ -1,5 +1,7 @@
 #include "util/agent_entry.h"
 
+#include <memory>
+
 #include "util/trace.h"
 
 namespace VMQ {
@@ -18,7 +20,8 @@ long slotOf(InstanceEntry* instance) {
 
 AgentEntry::AgentEntry(const String& productCode) : product_code_(productCode) {}
 
-AgentEntry::AgentEntry(const AgentEntry& other) : product_code_(other.product_code_) {
+// By way of the other constructor, so that the destructor frees what was copied when a later copy fails.
+AgentEntry::AgentEntry(const AgentEntry& other) : AgentEntry(other.product_code_) {
   const Trace trace(traceUnit);
   for (unsigned i = 0; i < other.getNumInstances(); ++i) {
     const InstanceEntry* const instance = other.getInstance(i);
@@ -32,7 +35,9 @@ AgentEntry::~AgentEntry() {
 }
 
 void AgentEntry::addInstance(InstanceEntry* instance) {
+  std::unique_ptr<InstanceEntry> owner(instance);
   instances_.append(slotOf(instance));
+  (void)owner.release();  // the slot's from now on
 }
 
 void AgentEntry::removeInstance(unsigned index) {

@@ -1,5 +1,7 @@
 #include "util/dom_element.h"
 
+#include <memory>
+
 #include "util/dom_attr.h"
 #include "util/trace.h"
 
@@ -47,7 +49,10 @@ void DOMElement::setElementText(const char* text) {
 
 void DOMElement::setAttribute(const char* name, const char* value) {
   const Trace trace(traceUnit);
-  if (name != nullptr && value != nullptr) attributes_.append(new DOMAttr(name, value));
+  if (name == nullptr || value == nullptr) return;
+  auto attribute = std::make_unique<DOMAttr>(name, value);
+  attributes_.append(attribute.get());
+  (void)attribute.release();  // the list's from now on
 }
 
 const unsigned short* DOMElement::getAttribute(const char* name) const {
@@ -83,13 +88,13 @@ DOMNodeList* DOMElement::getElementsByTagName(const unsigned short* tagName) {
   void* cached = nullptr;
   if (tag_cache_.get(name, &cached)) return static_cast<DOMNodeList*>(cached);
 
-  auto* const found = new DOMNodeList(!ownsNodes);
-  tag_cache_.put(name, found);
+  auto found = std::make_unique<DOMNodeList>(!ownsNodes);
   for (DOMNode* const node : children_) {
     auto* const child = static_cast<DOMElement*>(node);
     if (String::compare(child->getTagName(), tagName) == 0) found->append(child);
   }
-  return found;
+  tag_cache_.put(name, found.get());
+  return found.release();  // the cache's from now on
 }
 
 void DOMElement::dump(String& out) const {

@@ -60,12 +60,15 @@ std::string asXml(const StartupDB& database, bool& readable) {
 
 }  // namespace
 
-StartupDB::StartupDB(const String& fileName) : file_name_(fileName) {
+StartupDB::StartupDB(const String& fileName, Empty) : file_name_(fileName) {}
+
+// These two by way of the first, so that the destructor frees the agents when a later one fails.
+StartupDB::StartupDB(const String& fileName) : StartupDB(fileName, Empty()) {
   const Trace trace(traceUnit);
   initialize();
 }
 
-StartupDB::StartupDB(const StartupDB& other) : file_name_(other.file_name_) {
+StartupDB::StartupDB(const StartupDB& other) : StartupDB(other.file_name_, Empty()) {
   const Trace trace(traceUnit);
   for (unsigned i = 0; i < other.getNumAgents(); ++i) {
     const AgentEntry* const agent = other.getAgent(i);
@@ -79,7 +82,9 @@ StartupDB::~StartupDB() {
 }
 
 void StartupDB::addAgent(AgentEntry* agent) {
+  std::unique_ptr<AgentEntry> owner(agent);
   agents_.append(slotOf(agent));
+  (void)owner.release();  // the slot's from now on
 }
 
 void StartupDB::removeAgent(unsigned index) {

@@ -57,6 +57,9 @@ class StartupDB {
   void buildModel(DOMElement* root);
 
  private:
+  struct Empty {};
+  StartupDB(const String& fileName, Empty);
+
   const String file_name_;
   Array<long> agents_;  // AgentEntry pointers, owned
 };
