@@ -9,8 +9,8 @@
 
 #include "process/pipes.h"
 #include "test_seam.h"
-#include "tests/support/system_faults.h"
 #include "tests/support/nothing_left_behind.h"
+#include "tests/support/system_faults.h"
 
 namespace {
 

@@ -11,11 +11,11 @@
 #include <filesystem>
 #include <thread>
 
-#include "tests/support/system_faults.h"
 #include "tests/rpc/transfer_fixture.h"
 #include "tests/support/failing_allocation.h"
 #include "tests/support/process_resources.h"
 #include "tests/support/scratch_file_system.h"
+#include "tests/support/system_faults.h"
 #include "util/util.h"
 
 namespace {
