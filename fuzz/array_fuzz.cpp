@@ -52,16 +52,6 @@ class Twins {
     twin_.clear();
     capacity_ = 8;
   }
-  template <typename Operation>
-  bool happens(bool valid, Operation operation) {
-    try {
-      operation();
-      fuzz::require(valid, "what is out of range throws");
-    } catch (const VMQ::IndexOutOfBoundsException&) {
-      fuzz::require(!valid, "what is in range does not throw");
-    }
-    return valid;
-  }
 
   void change() {
     const unsigned at = anyPosition();
@@ -85,11 +75,11 @@ class Twins {
         twin_.insert(twin_.end(), own.begin(), own.end());
         break;
       case 3:
-        if (happens(at <= twin_.size(), [&] { array_.insert(at, more.data(), size); }))
+        if (fuzz::happens(at <= twin_.size(), [&] { array_.insert(at, more.data(), size); }))
           twin_.insert(twin_.begin() + at, more.begin(), more.end());
         break;
       case 4:
-        if (happens(at <= twin_.size(), [&] { array_.insert(at, array_.getData() + first, count); }))
+        if (fuzz::happens(at <= twin_.size(), [&] { array_.insert(at, array_.getData() + first, count); }))
           twin_.insert(twin_.begin() + at, own.begin(), own.end());
         break;
       case 5:
@@ -98,12 +88,12 @@ class Twins {
         break;
       case 6: {
         const unsigned many = anyPosition();
-        if (happens(uint64_t{at} + many <= twin_.size(), [&] { array_.remove(at, many); }))
+        if (fuzz::happens(uint64_t{at} + many <= twin_.size(), [&] { array_.remove(at, many); }))
           twin_.erase(twin_.begin() + at, twin_.begin() + at + many);
         break;
       }
       case 7:
-        if (happens(at < twin_.size(), [&] { array_[at] = element<T>(first); })) twin_[at] = element<T>(first);
+        if (fuzz::happens(at < twin_.size(), [&] { array_[at] = element<T>(first); })) twin_[at] = element<T>(first);
         break;
       case 8: {
         Array<T> copy(array_);

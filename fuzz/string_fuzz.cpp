@@ -38,17 +38,6 @@ class Twins {
     text_.clear();
     model_.clear();
   }
-  /// The operation throws, unless `valid`, and then changes nothing.
-  template <typename Operation>
-  bool happens(bool valid, Operation operation) {
-    try {
-      operation();
-      fuzz::require(valid, "what is out of range throws");
-    } catch (const VMQ::IndexOutOfBoundsException&) {
-      fuzz::require(!valid, "what is in range does not throw");
-    }
-    return valid;
-  }
   /// Mostly near the length, sometimes so far that sums would wrap.
   unsigned anyPosition() {
     const unsigned choice = input_.byte();
@@ -72,13 +61,14 @@ class Twins {
         model_ += other;
         break;
       case 2:
-        if (happens(count <= model_.size(), [&] { text_.append(text_, count); })) model_ += model_.substr(0, count);
+        if (fuzz::happens(count <= model_.size(), [&] { text_.append(text_, count); }))
+          model_ += model_.substr(0, count);
         break;
       case 3:
-        if (happens(inRange(at, count), [&] { text_.erase(at, count); })) model_.erase(at, count);
+        if (fuzz::happens(inRange(at, count), [&] { text_.erase(at, count); })) model_.erase(at, count);
         break;
       case 4:
-        if (happens(at < model_.size(), [&] { text_.erase(at); })) model_.erase(at);
+        if (fuzz::happens(at < model_.size(), [&] { text_.erase(at); })) model_.erase(at);
         break;
       case 5:
         text_.trim();
@@ -135,17 +125,17 @@ class Twins {
     const int expected = model_.compare(other);
     fuzz::require((sign < 0) == (expected < 0) && (sign > 0) == (expected > 0), "texts are in order");
     unsigned found = 0;
-    if (happens(at < model_.size(), [&] { found = text_.find(comma, at); })) {
+    if (fuzz::happens(at < model_.size(), [&] { found = text_.find(comma, at); })) {
       fuzz::require(found == position(model_.find(u',', at)), "a unit is found where it is");
     }
-    if (happens(at < model_.size(), [&] { found = text_.find(comma, ESC, at); })) {
+    if (fuzz::happens(at < model_.size(), [&] { found = text_.find(comma, ESC, at); })) {
       fuzz::require(found == position(findUnescaped(model_, u',', at)), "so is one that is not escaped");
     }
     String slice;
-    if (happens(inRange(at, count), [&] { slice = text_.substr(at, count); })) {
+    if (fuzz::happens(inRange(at, count), [&] { slice = text_.substr(at, count); })) {
       fuzz::require(slice == textOf(model_.substr(at, count)), "a piece is what stands there");
     }
-    if (happens(at <= model_.size(), [&] { found = text_[at]; })) {
+    if (fuzz::happens(at <= model_.size(), [&] { found = text_[at]; })) {
       fuzz::require(found == (at < model_.size() ? model_[at] : 0), "and so is a unit");
     }
   }

@@ -6,6 +6,8 @@
 #include <string>
 #include <string_view>
 
+#include "util/index_out_of_bounds_exception.h"
+
 /// The entry of each target, called with one input after the other. 0: the input may be kept.
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size);
 
@@ -16,6 +18,18 @@ namespace fuzz {
 
 /// Ends the process, which makes the input a finding, when a promise of the code under test is broken.
 void require(bool holds, const char* promise);
+
+/// The operation throws a range error, unless it is `valid`; its `valid` is returned.
+template <typename Operation>
+bool happens(bool valid, Operation operation) {
+  try {
+    operation();
+    require(valid, "what is out of range throws");
+  } catch (const VMQ::IndexOutOfBoundsException&) {
+    require(!valid, "what is in range does not throw");
+  }
+  return valid;
+}
 
 /// Takes an input apart. Behind its end come zeros and empty texts.
 class Input {

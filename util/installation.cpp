@@ -46,6 +46,17 @@ bool getDirectory(String& cached, bool (*initialize)(String&), String& dir) {
   return dir.length() > 0;
 }
 
+bool readHomeVariable(const Trace& trace, String& home) {
+  const char* const value = BSS1_GetEnv(homeVariable, nullptr);
+  if (value == nullptr) {
+    TRACE_ERROR(trace, "Environment variable %s, does not exist", homeVariable);
+    return false;
+  }
+  home = String(value);
+  home.trim();
+  return true;
+}
+
 }  // namespace
 
 bool Util::getCorvelHomeDir(String& dir) {
@@ -69,13 +80,8 @@ bool Util::getAgentDepotDir(String& dir) {
 bool Util::initCorvelHomeDir(String& dir) {
   const Trace trace(traceUnit);
   dir.clear();
-  const char* const value = BSS1_GetEnv(homeVariable, nullptr);
-  if (value == nullptr) {
-    TRACE_ERROR(trace, "Environment variable %s, does not exist", homeVariable);
-    return false;
-  }
-  String home(value);
-  home.trim();
+  String home;
+  if (!readHomeVariable(trace, home)) return false;
   if (!pathExists(home)) {
     TRACE_ERROR(trace, "Corvel Home directory, %s, does not exist", home.c_str().get());
     return false;
@@ -88,13 +94,8 @@ bool Util::initCorvelHomeDir(String& dir) {
 bool Util::initCorvelConfigDir(String& dir) {
   const Trace trace(traceUnit);
   dir.clear();
-  const char* const value = BSS1_GetEnv(homeVariable, nullptr);
-  if (value == nullptr) {
-    TRACE_ERROR(trace, "Environment variable %s, does not exist", homeVariable);
-    return false;
-  }
-  String config(value);
-  config.trim();
+  String config;
+  if (!readHomeVariable(trace, config)) return false;
   endWithSlash(config);
   config.append(String("config/"));
   if (!pathExists(config)) {

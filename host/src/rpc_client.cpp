@@ -46,11 +46,11 @@ RpcResult dispatch(rpc__server_stub stub, const RpcCall& call, const void* manag
 RpcResult call(const RpcCall& call) {
   const RegisteredInterface found = findInterface(call.interface, call.version);
   RpcResult result;
-  if (found.specification == nullptr) {
+  if (found.interface == nullptr) {
     result.outcome = found.known_in_other_version ? RpcResult::kUnknownVersion : RpcResult::kUnknownInterface;
     return result;
   }
-  const rpc__server_epv epv = found.specification->server_epv_locator();
+  const rpc__server_epv epv = found.interface->server_epv_locator();
   if (call.operation >= epv.operations) {
     result.outcome = RpcResult::kUnknownOperation;
     return result;

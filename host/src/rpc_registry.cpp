@@ -12,7 +12,7 @@
 namespace {
 
 struct Entry {
-  const rpc__if_spec* specification;
+  const rpc__if_spec* interface;
   const void* manager;
 };
 
@@ -28,8 +28,8 @@ std::vector<Entry>& entries() {
 vmqhost::RegisteredInterface find(const rpc__uuid& id, uint32_t version) {
   vmqhost::RegisteredInterface found;
   for (const Entry& each : entries()) {
-    if (!(each.specification->id == id)) continue;
-    if (each.specification->version == version) return {each.specification, each.manager, false};
+    if (!(each.interface->id == id)) continue;
+    if (each.interface->version == version) return {each.interface, each.manager, false};
     found.known_in_other_version = true;
   }
   return found;
@@ -42,7 +42,7 @@ bool acceptable(const rpc__uuid* type, const rpc__if_spec* interface, const void
 
 uint32_t add(const rpc__if_spec* interface, const void* manager) try {
   const std::lock_guard held(mutex);
-  if (find(interface->id, interface->version).specification != nullptr) return EEXIST;
+  if (find(interface->id, interface->version).interface != nullptr) return EEXIST;
   entries().push_back({interface, manager});
   return 0;
 } catch (const std::bad_alloc&) {

@@ -6,7 +6,7 @@
 namespace vmqhost {
 
 struct RegisteredInterface {
-  const rpc__if_spec* specification = nullptr;  ///< null: not found
+  const rpc__if_spec* interface = nullptr;  ///< null: not found
   const void* manager = nullptr;
   bool known_in_other_version = false;  ///< when it is not found
 };

@@ -11,7 +11,7 @@
 #include "test_seam.h"
 #include "tests/mgmt/deployment_case.h"
 #include "tests/mgmt/fresh_process.h"
-#include "tests/mgmt/small_file_system.h"
+#include "tests/support/scratch_file_system.h"
 
 namespace {
 
@@ -74,7 +74,7 @@ std::string ended(const std::string& command, int retval = 0, const std::string&
 class Depot : public testing::Test {
  protected:
   void SetUp() override {
-    if (!canMount()) GTEST_SKIP() << "may not mount";
+    if (!canMount()) GTEST_SKIP() << "needs a file system of its own";
   }
 };
 
@@ -85,7 +85,7 @@ using StartupList = Depot;
 void restartInstallOnFullDepot() {
   const Machine machine;
   StatusEvents events;
-  const SmallFileSystem depot(machine.at("depot"));
+  const ScratchFileSystem depot(machine.at("depot"));
   depot.fill();
   machine.install("REQUIRES_RESTART");
   EXPECT_EQ(events.next(), ended("INSTALL"));
@@ -104,7 +104,7 @@ TEST_F(Depot, ThatIsFullEndsARestartInstallWithoutRunningHalfAScript) {
 void restartInstallOnReadOnlyDepot() {
   const Machine machine;
   StatusEvents events;
-  const SmallFileSystem depot(machine.at("depot"));
+  const ScratchFileSystem depot(machine.at("depot"));
   depot.makeReadOnly();
   machine.install("REQUIRES_RESTART");
   EXPECT_EQ(events.next(), ended("INSTALL"));
@@ -121,7 +121,7 @@ TEST_F(Depot, ThatMayOnlyBeReadEndsARestartInstallWithAnError) {
 void ordinaryInstallOnReadOnlyDepot() {
   const Machine machine;
   StatusEvents events;
-  const SmallFileSystem depot(machine.at("depot"));
+  const ScratchFileSystem depot(machine.at("depot"));
   machine.home.file("depot/rc.txt", "4\n");
   depot.makeReadOnly();
   machine.install("INSTANCE");
@@ -144,7 +144,7 @@ void modelOnFullFileSystem() {
   const Machine machine;
   machine.home.file("depot/m.mdl", std::string(100000, 'm'));
   StatusEvents events;
-  const SmallFileSystem models(machine.at("meta"));
+  const ScratchFileSystem models(machine.at("meta"));
   Machine::configure("m.mdl", "");
   EXPECT_EQ(events.next(), ended("SETCONFIG", 1014, "m.mdl," + machine.at("meta")));
   EXPECT_THAT(commandLines(machine.trace), SizeIs(1));  // the inventory tool: the console is not asked
@@ -159,7 +159,7 @@ void scriptsOnReadOnlyFileSystem() {
   const Machine machine;
   machine.home.file("depot/s.sh", "script");
   StatusEvents events;
-  const SmallFileSystem scripts(machine.at("work/scripts"));
+  const ScratchFileSystem scripts(machine.at("work/scripts"));
   scripts.makeReadOnly();
   Machine::configure("", "s.sh");
   EXPECT_EQ(events.next(), ended("SETCONFIG", 1015, "s.sh," + machine.at("work/scripts")));
@@ -176,7 +176,7 @@ void listOn(bool full) {
   machine.home.file("depot/m.mdl", "model");
   machine.home.file("config/.ConfigData/.keep", "");
   StatusEvents events;
-  const SmallFileSystem list(machine.at("config/.ConfigData"));
+  const ScratchFileSystem list(machine.at("config/.ConfigData"));
   const std::string file = machine.at("config/.ConfigData/kumenv");
   machine.home.file("config/.ConfigData/kumenv", kList);
   if (full) list.fill();

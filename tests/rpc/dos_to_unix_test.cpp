@@ -238,8 +238,8 @@ TEST_F(ConvertDos2UnixTest, AfterAFailedLinkTheContentsAreInTheWorkFileOnly) {
 }
 
 TEST_F(ConvertDos2UnixTest, FileOnAnotherFileSystemCannotBeLinked) {
+  if (!canMount()) GTEST_SKIP() << "needs a file system of its own";
   const ScratchFileSystem scratch(directory_ / "scratch", 64);
-  if (!scratch.isMounted()) GTEST_SKIP() << "needs a file system of its own";
   const std::string path = directory_.writeFile("scratch/file", "line\r\n");
   EXPECT_EQ(convertDOS2Unix(path.c_str()), -1);
   EXPECT_THAT(trace_.texts(RAS1_ERROR),

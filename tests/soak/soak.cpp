@@ -21,6 +21,7 @@
 #include "tests/soak/event_watchers.h"
 #include "tests/support/daemon_fixture.h"
 #include "tests/support/http_client.h"
+#include "tests/support/process_memory.h"
 
 namespace {
 
@@ -33,11 +34,6 @@ constexpr int kFewestRounds = 5;
 constexpr double kTolerableSlope = 40;  // KiB for 1000 requests: what a leak of 40 bytes in each would be
 constexpr size_t kLogShown = 4000;
 constexpr long kNoise = 1024;  // KiB that resident memory may differ by without any leak
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-constexpr bool kMemoryTells = false;  // a sanitizer keeps what is freed
-#else
-constexpr bool kMemoryTells = true;
-#endif
 
 constexpr char kInventory[] = R"(#!/bin/sh
 echo '"ProdCode","Description","Platform","Version","Release"
@@ -123,7 +119,7 @@ bool doesNotGrow(const std::vector<Footprint>& at_rest) {
   const long grown = last.resident_kib - first.resident_kib;
   std::printf("resident memory: %+ld KiB since the warm-up, %+.2f KiB for 1000 requests in the second half\n", grown,
               slope);
-  bool fine = !kMemoryTells || slope <= kTolerableSlope || grown <= kNoise;
+  bool fine = !memoryTells || slope <= kTolerableSlope || grown <= kNoise;
   for (const Footprint& footprint : at_rest) {
     fine = fine && footprint.threads == first.threads && footprint.descriptors == first.descriptors &&
            footprint.children == 0;

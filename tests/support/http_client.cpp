@@ -54,11 +54,16 @@ bool HttpClient::send(const std::string& bytes) {
   return true;
 }
 
-HttpReply HttpClient::request(const std::string& method, const std::string& path, const std::string& body,
-                              const std::string& headers) {
+bool HttpClient::sendRequest(const std::string& method, const std::string& path, const std::string& body,
+                             const std::string& headers) {
   std::string text = method + " " + path + " HTTP/1.1\r\nHost: localhost\r\n" + headers;
   if (!body.empty() || method == "POST") text += "Content-Length: " + std::to_string(body.size()) + "\r\n";
-  (void)send(text + "\r\n" + body);  // a server may have replied before it hung up
+  return send(text + "\r\n" + body);
+}
+
+HttpReply HttpClient::request(const std::string& method, const std::string& path, const std::string& body,
+                              const std::string& headers) {
+  (void)sendRequest(method, path, body, headers);  // a server may have replied before it hung up
   return receive();
 }
 

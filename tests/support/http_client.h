@@ -27,6 +27,9 @@ class HttpClient {
   HttpReply request(const std::string& method, const std::string& path, const std::string& body = "",
                     const std::string& headers = "");
 
+  /// The first half of request(); receive() is the second.
+  bool sendRequest(const std::string& method, const std::string& path, const std::string& body = "",
+                   const std::string& headers = "");
   /// Sends bytes as they are. False when the server has hung up.
   bool send(const std::string& bytes);
   /// Reads one whole reply.

@@ -1,21 +1,75 @@
 #include "tests/support/scratch_file_system.h"
 
+#include <fcntl.h>
+#include <gtest/gtest.h>
 #include <sched.h>
 #include <sys/mount.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
+#include <cerrno>
 #include <filesystem>
+#include <utility>
+
+namespace {
+
+bool write(const char* path, const std::string& text) {
+  const int file = open(path, O_WRONLY | O_CLOEXEC);
+  const bool written = file >= 0 && ::write(file, text.data(), text.size()) == static_cast<ssize_t>(text.size());
+  if (file >= 0) close(file);
+  return written;
+}
+
+/// Who is not root can be root of a user namespace.
+bool becomeRootOfOwnNamespace() {
+  const std::string user = std::to_string(geteuid());
+  const std::string group = std::to_string(getegid());
+  return unshare(CLONE_NEWUSER) == 0 && write("/proc/self/setgroups", "deny") &&
+         write("/proc/self/uid_map", "0 " + user + " 1") && write("/proc/self/gid_map", "0 " + group + " 1");
+}
+
+bool separateMounts() {
+  static bool separate = false;
+  if (separate) return true;
+  if (geteuid() != 0 && !becomeRootOfOwnNamespace()) return false;
+  separate = unshare(CLONE_NEWNS) == 0 && mount("none", "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0;
+  return separate;
+}
+
+}  // namespace
+
+bool canMount() {
+  const pid_t child = fork();
+  if (child == 0) _exit(separateMounts() && mount("none", "/tmp", "tmpfs", 0, "size=64k") == 0 ? 0 : 1);
+  int status = 1;
+  return child > 0 && waitpid(child, &status, 0) == child && status == 0;
+}
+
+void useOwnMountTable() {
+  ASSERT_TRUE(separateMounts());
+}
 
 ScratchFileSystem::ScratchFileSystem(std::string directory, unsigned kibibytes) : directory_(std::move(directory)) {
+  useOwnMountTable();
   std::filesystem::create_directories(directory_);
   const std::string options = "size=" + std::to_string(kibibytes) + "k";
-  mounted_ = unshare(CLONE_NEWNS) == 0 && mount("none", "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0 &&
-             mount("none", directory_.c_str(), "tmpfs", MS_NOSUID | MS_NODEV, options.c_str()) == 0;
+  EXPECT_EQ(mount("none", directory_.c_str(), "tmpfs", MS_NOSUID | MS_NODEV, options.c_str()), 0) << directory_;
 }
 
 ScratchFileSystem::~ScratchFileSystem() {
-  if (mounted_) (void)umount2(directory_.c_str(), MNT_DETACH);  // goes with the process if this fails
+  EXPECT_EQ(umount2(directory_.c_str(), MNT_DETACH), 0) << directory_;
 }
 
-bool ScratchFileSystem::makeReadOnly() const {
-  return mount("none", directory_.c_str(), nullptr, MS_REMOUNT | MS_RDONLY | MS_NOSUID | MS_NODEV, nullptr) == 0;
+void ScratchFileSystem::fill() const {
+  const int file = open((directory_ + "/filler").c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0600);
+  ASSERT_GE(file, 0);
+  const char block[512] = {};
+  while (::write(file, block, sizeof block) > 0) {
+  }
+  EXPECT_EQ(errno, ENOSPC);
+  close(file);
+}
+
+void ScratchFileSystem::makeReadOnly() const {
+  ASSERT_EQ(mount("none", directory_.c_str(), nullptr, MS_REMOUNT | MS_RDONLY | MS_NOSUID | MS_NODEV, nullptr), 0);
 }

@@ -3,21 +3,28 @@
 
 #include <string>
 
-/// A file system in memory, mounted where only this process (and its children) sees it, so that it goes with the
-/// process at the latest. It needs root; without, isMounted() is false.
+/// True when this process may have a mount table of its own: as root, and as another user where users may have
+/// namespaces.
+bool canMount();
+
+/// Gives this process a mount table of its own: what it mounts nobody else sees, and it is gone with the process at the
+/// latest. Threads that there are already keep the old one. Does nothing the second time. REQUIRES: canMount().
+void useOwnMountTable();
+
+/// A file system in memory in place of a directory, empty at first. What the directory held is there again afterwards.
+/// REQUIRES: canMount().
 class ScratchFileSystem {
  public:
-  /// `directory` is made.
-  ScratchFileSystem(std::string directory, unsigned kibibytes);
+  /// The directory is made when it is not there.
+  explicit ScratchFileSystem(std::string directory, unsigned kibibytes = 64);
   ~ScratchFileSystem();
   ScratchFileSystem(const ScratchFileSystem&) = delete;
   ScratchFileSystem& operator=(const ScratchFileSystem&) = delete;
 
-  [[nodiscard]] bool isMounted() const { return mounted_; }
-  /// False when it cannot be.
-  [[nodiscard]] bool makeReadOnly() const;
+  /// Files can still be made, but nothing can be written into them.
+  void fill() const;
+  void makeReadOnly() const;
 
  private:
   const std::string directory_;
-  bool mounted_ = false;
 };

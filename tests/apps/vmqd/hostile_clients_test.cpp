@@ -175,9 +175,7 @@ TEST(LongQuery, IsNotTheClientsTime) {
   const TestDaemon daemon({hastyClients});
   Gate gate(daemon.directory() / "gate");
   HttpClient client(daemon.socket());
-  const std::string body = gate.query();
-  ASSERT_TRUE(client.send("POST /v1/tables/GATE/query HTTP/1.1\r\nHost: x\r\nContent-Length: " +
-                          std::to_string(body.size()) + "\r\n\r\n" + body));
+  ASSERT_TRUE(client.sendRequest("POST", "/v1/tables/GATE/query", gate.query()));
   gate.waitForQuery();
   std::this_thread::sleep_for(4500ms);
   gate.open();

@@ -199,9 +199,7 @@ TEST(Stop, DoesNotWaitForeverForAQuery) {
   TestDaemon daemon({"stop_seconds = 0"});
   Gate gate(daemon.directory() / "gate");
   HttpClient client(daemon.socket());
-  const std::string body = gate.query();
-  ASSERT_TRUE(client.send("POST /v1/tables/GATE/query HTTP/1.1\r\nHost: x\r\nContent-Length: " +
-                          std::to_string(body.size()) + "\r\n\r\n" + body));
+  ASSERT_TRUE(client.sendRequest("POST", "/v1/tables/GATE/query", gate.query()));
   gate.waitForQuery();
   EXPECT_EQ(0, daemon.stop());
   EXPECT_TRUE(client.hungUp());
