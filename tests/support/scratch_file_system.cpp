@@ -28,8 +28,9 @@ bool becomeRootOfOwnNamespace() {
          write("/proc/self/uid_map", "0 " + user + " 1") && write("/proc/self/gid_map", "0 " + group + " 1");
 }
 
+bool separate = false;
+
 bool separateMounts() {
-  static bool separate = false;
   if (separate) return true;
   if (geteuid() != 0 && !becomeRootOfOwnNamespace()) return false;
   separate = unshare(CLONE_NEWNS) == 0 && mount("none", "/", nullptr, MS_REC | MS_PRIVATE, nullptr) == 0;
@@ -39,6 +40,7 @@ bool separateMounts() {
 }  // namespace
 
 bool canMount() {
+  if (separate) return true;
   const pid_t child = fork();
   if (child == 0) _exit(separateMounts() && mount("none", "/tmp", "tmpfs", 0, "size=64k") == 0 ? 0 : 1);
   int status = 1;
