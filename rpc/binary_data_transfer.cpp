@@ -11,6 +11,7 @@
 
 #include "rpc/dos_to_unix.h"
 #include "util/current_exception.h"
+#include "util/parent_component.h"
 #include "util/stream.h"
 #include "util/trace.h"
 #include "util/util.h"
@@ -46,10 +47,6 @@ String cleaned(const char* fileName) {
   return name;
 }
 
-bool hasParentComponent(const String& name) {
-  return (String("/") + name + String("/")).find(String("/../"), 0) != String::NPOS;
-}
-
 bool makeDirectoryOf(const Trace& trace, const String& path) {
   const unsigned slash = path.rfind('/');
   if (slash == String::NPOS) return true;
@@ -61,6 +58,11 @@ bool makeDirectoryOf(const Trace& trace, const String& path) {
   return false;
 }
 
+bool isRegular(FILE* file) {
+  struct stat status;
+  return fstat(fileno(file), &status) == 0 && S_ISREG(status.st_mode);
+}
+
 Stream open(const Trace& trace, const String& path, int32_t chunkNumber) {
   const std::string name = path.toNarrow();
   const bool isFirst = chunkNumber == firstChunk;
@@ -70,6 +72,7 @@ Stream open(const Trace& trace, const String& path, int32_t chunkNumber) {
   }
   const char* const mode = isFirst ? "wb" : "a+b";
   Stream file(std::fopen(name.c_str(), isFirst ? "wbe" : "a+be"));
+  if (file && !isRegular(file.get())) file.reset();  // a conversion that waits for a pipe would hold up all others
   if (!file) {
     TRACE_ERROR(trace, "Failed to open file %s using mode \"%s\", check permissions", path.c_str().get(), mode);
     return file;
@@ -144,7 +147,7 @@ Status store(const Trace& trace, const char* fileName, int32_t chunkNumber, int3
   }
   const String name = cleaned(fileName);
   TRACE_DETAIL(trace, "Destination path name is: %s", name.c_str().get());
-  if (hasParentComponent(name)) {
+  if (VMQ::hasParentComponent(name)) {
     TRACE_ERROR(trace, "File name [%s] is refused: \"..\" leads out of its directory", name.c_str().get());
     return notOpened;
   }

@@ -6,8 +6,9 @@
 #include "util/string.h"
 
 /// Removes every carriage return and every control-Z from a file, wherever they stand. The file gets mode 0770. 0, or
-/// -1 when that fails, with a trace of the reason: the file is then as it was; only after a failed hard link it is
-/// missing, and its converted contents are in the work file.
+/// -1 when that fails, with a trace of the reason: the file is then as it was. Two failures come later: after that of
+/// the hard link the file is missing, and its converted contents are in the work file; after that of removing the work
+/// file the file is converted, and the work file a second name of it.
 ///
 /// The work file is "/tmp/.vmqtemp" in the installation home, or ".vmqtemp" in the current directory when there is no
 /// home. It has to be on the file system of the converted file, since it becomes that file. One conversion runs at a

@@ -9,6 +9,7 @@
 #include "tasks/start_stop.h"
 #include "tasks/task_manager.h"
 #include "util/corvel_home.h"
+#include "util/parent_component.h"
 #include "util/str_str_map.h"
 #include "util/string_tokenizer.h"
 #include "util/trace.h"
@@ -66,14 +67,6 @@ class DaConfiguration {
   String scripts_directory_;
   String type_;
 };
-
-/// True when a component of the path is "..": such a name would leave the directory it is put under.
-bool leavesDirectory(const String& name) {
-  StringTokenizer components(name, "/");
-  while (components.hasMoreTokens())
-    if (components.nextToken() == "..") return true;
-  return false;
-}
 
 String valueBehindEquals(const String& token) {
   const unsigned equals = token.find(static_cast<unsigned short>('='), 0);
@@ -182,7 +175,7 @@ TASK_RC DaConfiguration::findDirectories() {
 }
 
 bool DaConfiguration::copyFromDepot(const String& name, const String& directory) const {
-  return !leavesDirectory(name) && Util::copyFile(depotDir + name, directory) == 0;
+  return !hasParentComponent(name) && Util::copyFile(depotDir + name, directory) == 0;
 }
 
 TASK_RC DaConfiguration::copyModel() {

@@ -29,7 +29,7 @@ void ClientDeadlines::run() {
       (void)changed_.wait_until(held, std::chrono::steady_clock::time_point(first.deadline_));
       continue;
     }
-    // Its connection's own thread closes the descriptor, and takes the lock before.
+    // Still that connection's: a client leaves the list, under this lock, before its descriptor is closed.
     (void)shutdown(first.descriptor_, SHUT_RDWR);
     rest(first);
   }

@@ -7,7 +7,6 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <cstdio>
 
 #include "apps/vmqd/config_values.h"
 #include "apps/vmqd/descriptor.h"

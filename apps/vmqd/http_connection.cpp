@@ -72,8 +72,8 @@ HttpConnection::HttpConnection(HttpServer& server, MHD_Connection* connection)
     : server_(server),
       connection_(connection),
       descriptor_(descriptorOf(connection)),
+      open_(server.connections_),
       deadline_(server.deadlines_, descriptor_) {
-  server_.connections_.begin();
   one_too_many_ = server_.connections_.count() > server_.limits_.maximum_connections;
   const auto peer = peerOf(descriptor_);
   admitted_ = peer && server_.users_.admits(peer->uid);
@@ -83,10 +83,6 @@ HttpConnection::HttpConnection(HttpServer& server, MHD_Connection* connection)
     logWarning("refused the user " + std::to_string(peer->uid) + ", process " + std::to_string(peer->pid));
   }
   deadline_.await();
-}
-
-HttpConnection::~HttpConnection() {
-  server_.connections_.end();
 }
 
 MHD_Result HttpConnection::begin(const char* method, const char* path) {
@@ -100,14 +96,20 @@ MHD_Result HttpConnection::begin(const char* method, const char* path) {
     return refuseNow(errors::busy,
                      "There are already " + std::to_string(server_.limits_.maximum_connections) + " connections.");
   }
-  uint64_t bytes = maximum_bytes_;  // it may become as large when its length is not announced
-  if (const std::string_view digits = headerValue(MHD_HTTP_HEADER_CONTENT_LENGTH); !digits.empty()) {
-    bytes = UINT64_MAX;  // also what a number that is too large for 64 bits leaves
-    (void)std::from_chars(digits.data(), digits.data() + digits.size(), bytes);
-  }
+  const uint64_t bytes = announcedBytes().value_or(maximum_bytes_);  // without a length it may become as large
   if (bytes > maximum_bytes_) return bodyTooLarge();
   if (is_packet) makeRoomForPacket(bytes);
   return MHD_YES;
+}
+
+std::optional<uint64_t> HttpConnection::announcedBytes() const {
+  // A body in pieces is as long as its pieces, whatever length is announced beside.
+  if (!headerValue(MHD_HTTP_HEADER_TRANSFER_ENCODING).empty()) return std::nullopt;
+  const std::string_view digits = headerValue(MHD_HTTP_HEADER_CONTENT_LENGTH);
+  if (digits.empty()) return std::nullopt;
+  uint64_t bytes = UINT64_MAX;
+  (void)std::from_chars(digits.data(), digits.data() + digits.size(), bytes);
+  return bytes;
 }
 
 void HttpConnection::makeRoomForPacket(size_t bytes) {
@@ -132,7 +134,7 @@ MHD_Result HttpConnection::takeBody(const char* piece, size_t bytes) {
 MHD_Result HttpConnection::answer(const char* method, const char* path) {
   deadline_.proceed();
   if (body_bytes_ > maximum_bytes_) return bodyTooLarge();
-  Request request{method, path, {}, {}, body_, headerValue("Data-Representation"), descriptor_};
+  Request request{method, path, {}, {}, body_, headerValue(representationHeader), descriptor_};
   (void)MHD_get_connection_values_n(connection_, MHD_GET_ARGUMENT_KIND, collectArgument, &request.arguments);
   server_.unfinished_.begin();
   unfinished_ = true;

@@ -4,6 +4,7 @@
 #include <microhttpd.h>
 
 #include <cstddef>
+#include <cstdint>
 #include <optional>
 #include <string>
 
@@ -12,12 +13,12 @@
 
 namespace vmqd {
 
-/// Its buffers stay from request to request. One thread at a time: that of the connection.
+/// Its buffers stay from request to request. One thread at a time: it is made and destroyed by the one that accepts
+/// connections, before and after its own thread works on its requests.
 class HttpConnection {
  public:
   /// `connection` was accepted just now.
   HttpConnection(HttpServer& server, MHD_Connection* connection);
-  ~HttpConnection();
   HttpConnection(const HttpConnection&) = delete;
   HttpConnection& operator=(const HttpConnection&) = delete;
 
@@ -30,6 +31,8 @@ class HttpConnection {
  private:
   MHD_Result refuseNow(const ErrorCode& code, const std::string& sentence);
   MHD_Result bodyTooLarge();
+  /// What the header says of the length of the body; nothing where it does not.
+  [[nodiscard]] std::optional<uint64_t> announcedBytes() const;
   void makeRoomForPacket(size_t bytes);
   void giveRoomBack();
   [[nodiscard]] std::string_view headerValue(const char* name) const;
@@ -38,6 +41,7 @@ class HttpConnection {
   HttpServer& server_;
   MHD_Connection* const connection_;
   const int descriptor_;
+  const Activity::Scope open_;
   ClientDeadlines::Client deadline_;
   bool admitted_ = false;
   bool one_too_many_ = false;

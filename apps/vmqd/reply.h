@@ -11,6 +11,9 @@
 
 namespace vmqd {
 
+/// The header that labels a packet with how numbers and texts are written in it.
+inline constexpr const char* representationHeader = "Data-Representation";
+
 struct Argument {
   std::string_view name;
   std::string_view value;
@@ -23,7 +26,7 @@ struct Request {
   std::array<std::string_view, 2> parameters;  ///< what stands in the path where the route has its "{...}"s
   std::vector<Argument> arguments;             ///< of the query string, decoded, in the order sent
   std::string_view body;
-  std::string_view representation;  ///< the header Data-Representation; empty when there is none
+  std::string_view representation;  ///< the header of that name; empty when there is none
   int client = -1;                  ///< descriptor of the connection
 };
 

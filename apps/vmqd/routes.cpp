@@ -15,13 +15,13 @@ namespace vmqd {
 namespace {
 
 constexpr Route table[] = {
-    {"GET", "/v1", answerService, Body::kText},
-    {"GET", "/v1/health", answerHealth, Body::kText},
-    {"GET", "/v1/tables", answerTables, Body::kText},
-    {"POST", "/v1/tables/{table}/query", answerQuery, Body::kText},
-    {"GET", "/v1/tables/{table}/events", answerEvents, Body::kText},
-    {"POST", "/v1/rpc/{interface}/{operation}", answerCall, Body::kPacket},
-    {"GET", "/v1/depot/{path}", answerDepotFile, Body::kText},
+    {"GET", "/v1", answerService, Body::kText, Arguments::kNone},
+    {"GET", "/v1/health", answerHealth, Body::kText, Arguments::kNone},
+    {"GET", "/v1/tables", answerTables, Body::kText, Arguments::kNone},
+    {"POST", "/v1/tables/{table}/query", answerQuery, Body::kText, Arguments::kNone},
+    {"GET", "/v1/tables/{table}/events", answerEvents, Body::kText, Arguments::kSome},
+    {"POST", "/v1/rpc/{interface}/{operation}", answerCall, Body::kPacket, Arguments::kSome},
+    {"GET", "/v1/depot/{path}", answerDepotFile, Body::kText, Arguments::kNone},
 };
 
 constexpr std::string_view restParameter = "{path}";
@@ -56,11 +56,19 @@ bool match(std::string_view pattern, std::string_view path, std::array<std::stri
   return pattern.empty() && path.empty();
 }
 
+void answerBy(const Route& route, Service& service, const Request& request, Reply& reply) {
+  if (route.arguments == Arguments::kNone && !request.arguments.empty()) {
+    throw Refusal(errors::badRequest, inQuotes(request.path) + " takes no arguments, but it was given " +
+                                          inQuotes(request.arguments.front().name) + ".");
+  }
+  route.answer(service, request, reply);
+}
+
 void dispatch(Service& service, Request& request, Reply& reply) {
   std::string allowed;
   for (const Route& route : table) {
     if (!match(route.path, request.path, request.parameters)) continue;
-    if (route.method == request.method) return route.answer(service, request, reply);
+    if (route.method == request.method) return answerBy(route, service, request, reply);
     if (!allowed.empty()) allowed += ", ";
     allowed += route.method;
   }

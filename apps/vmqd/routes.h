@@ -12,6 +12,9 @@ namespace vmqd {
 /// What the body of a request is; each kind has limits of its own.
 enum class Body { kText, kPacket };
 
+/// Whether the query string may hold any; a route that takes some refuses those it does not know.
+enum class Arguments { kNone, kSome };
+
 struct Route {
   std::string_view method;
   /// With up to two "{parameter}"s, each of which stands for one segment; "{path}" stands for all that follows, which
@@ -19,6 +22,7 @@ struct Route {
   std::string_view path;
   void (*answer)(Service& service, const Request& request, Reply& reply);
   Body body;
+  Arguments arguments;
 };
 
 /// Routes with the same path stand next to each other.

@@ -12,8 +12,6 @@
 namespace vmqd {
 namespace {
 
-constexpr const char* labelHeader = "Data-Representation";
-
 std::optional<uint32_t> numberIn(std::string_view text) {
   uint32_t number = 0;
   const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
@@ -35,7 +33,7 @@ uint32_t versionOf(const Request& request) {
 
 rpc__drep senderOf(const Request& request) {
   if (const auto sender = vmqhost::parseLabel(request.representation)) return *sender;
-  const std::string header = std::string("The header ") + labelHeader;
+  const std::string header = std::string("The header ") + representationHeader;
   if (request.representation.empty()) throw Refusal(errors::badRequest, header + " is missing.");
   throw Refusal(errors::badRequest, header + " is " + inQuotes(request.representation) +
                                         ", but only 00000000, 10000000, 01000000 and 11000000 are known.");
@@ -92,7 +90,7 @@ void answerCall(Service&, const Request& request, Reply& reply) {
   }
   reply.text = std::move(result.reply);
   reply.content_type = "application/octet-stream";
-  reply.headers.emplace_back(labelHeader, vmqhost::labelOf(result.representation));
+  reply.headers.emplace_back(representationHeader, vmqhost::labelOf(result.representation));
 }
 
 }  // namespace vmqd

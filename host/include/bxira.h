@@ -107,6 +107,10 @@ class bxira {
   /// status, ENOTCONN when there is no requester, or EIO when it threw. No row waits afterwards, delivered or not.
   unsigned Dispatch();
 
+  /// The status of an insertion that has failed since the last call, 0 when none has: what was dispatched is then not
+  /// all there was.
+  unsigned takeInsertionFailure();
+
   /// Makes the request with this handle the calling thread's current one and counts a use. Returns 0 or ENOENT.
   static unsigned UseHandle(RES1_Handle handle);
   /// What the calling thread has made current and not dropped since; 0 when there is nothing.
@@ -125,6 +129,7 @@ class bxira {
 
  private:
   unsigned rowBytes();
+  unsigned insert(const char* row);
 
   const RequestDetail detail_;
   ContextInfo* const context_;
@@ -132,6 +137,7 @@ class bxira {
   RES1_Handle handle_;
   size_t next_predicate_ = 0;  // one thread at a time: construction, then the sampling thread
   mutable std::mutex rows_mutex_;
-  std::vector<char> rows_;  // guarded by rows_mutex_, like waiting_
+  std::vector<char> rows_;  // guarded by rows_mutex_, like what follows
   unsigned waiting_ = 0;
+  unsigned insertion_failure_ = 0;
 };

@@ -44,7 +44,7 @@ class OpenRequest {
   OpenRequest& operator=(const OpenRequest&) = delete;
 
   /// Runs the table's sampling on the calling thread (it may take long) and dispatches the rows. Returns the status of
-  /// the dispatch.
+  /// the dispatch, or else that of an insertion that failed: rows are missing then.
   unsigned sample();
 
   [[nodiscard]] bxira& request() { return *request_; }

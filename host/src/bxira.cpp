@@ -68,7 +68,16 @@ unsigned bxira::rowBytes() {
   return bytes;
 }
 
-unsigned bxira::InsertRow(char* row) try {
+unsigned bxira::InsertRow(char* row) {
+  const unsigned status = insert(row);
+  if (status != 0) {
+    const std::lock_guard held(rows_mutex_);
+    insertion_failure_ = status;
+  }
+  return status;
+}
+
+unsigned bxira::insert(const char* row) try {
   if (int status; vmqhost::seam::fails("InsertRow", &status)) return static_cast<unsigned>(status);
   if (row == nullptr) return EINVAL;
   const unsigned bytes = rowBytes();
@@ -92,6 +101,11 @@ unsigned bxira::Dispatch() try {
   return context_->requester->rowsArrived(rows.data(), bytes, count);
 } catch (...) {
   return EIO;
+}
+
+unsigned bxira::takeInsertionFailure() {
+  const std::lock_guard held(rows_mutex_);
+  return std::exchange(insertion_failure_, 0);
 }
 
 unsigned bxira::allocatedRows() const {

@@ -84,9 +84,10 @@ unsigned OpenRequest::sample() {
   const RES1_Handle handle = request_->handle();
   (void)bxira::UseHandle(handle);  // exists as long as the request
   request_->TakeSample();
-  const unsigned status = request_->Dispatch();
+  const unsigned dispatched = request_->Dispatch();
+  const unsigned inserted = request_->takeInsertionFailure();
   (void)RES1_Drop(handle);
-  return status;
+  return dispatched != 0 ? dispatched : inserted;
 }
 
 }  // namespace vmqhost

@@ -190,8 +190,10 @@ TEST_F(Request, TellsThatThereIsNoMemoryForARowAndKeepsTheOthers) {
     EXPECT_TRUE(failing.happened());
   }
   EXPECT_EQ(request.row_count, 1u);
-  request.Dispatch();
+  EXPECT_EQ(request.Dispatch(), 0u);
   EXPECT_THAT(collector_.rows, ElementsAre(kRow));
+  EXPECT_EQ(request.takeInsertionFailure(), unsigned{ENOMEM}) << "they are not all there was";
+  EXPECT_EQ(request.takeInsertionFailure(), 0u) << "told once";
 }
 
 TEST_F(Request, WithoutARequesterDropsItsRowsAndSaysSo) {

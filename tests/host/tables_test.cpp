@@ -6,6 +6,7 @@
 #include <cerrno>
 
 #include "table_client.h"
+#include "test_seam.h"
 #include "tests/host/sample_table.h"
 
 namespace {
@@ -130,6 +131,14 @@ TEST_F(OpenRequests, GiveBackWhatTheRequesterAnswers) {
   table_.sample = {sampleRow("a", 1, "")};
   collector_.status = 77;
   EXPECT_EQ(open({}, collector_)->sample(), 77u);
+}
+
+TEST_F(OpenRequests, GiveBackThatARowCouldNotBeInserted) {
+  table_.sample = {sampleRow("a", 1, ""), sampleRow("b", 2, "")};
+  const auto request = open({}, collector_);
+  const TEST_FailCall failing("InsertRow", 2, ENOMEM);
+  EXPECT_EQ(request->sample(), unsigned{ENOMEM});
+  EXPECT_THAT(collector_.rows, ElementsAre(table_.sample[0]));
 }
 
 TEST_F(OpenRequests, AreCurrentWhileTheyAreSampled) {

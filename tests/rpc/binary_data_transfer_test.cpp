@@ -190,6 +190,17 @@ TEST_F(BinaryDataTransferTest, NameOfADirectoryCannotBeOpened) {
   EXPECT_TRUE(trace_.has(RAS1_ERROR, "Failed to open file " + depot_ + "dir using mode \"wb\", check permissions"));
 }
 
+// Who waits for the other end of a pipe would hold up every conversion.
+TEST_F(BinaryDataTransferTest, WhatIsNoFileCannotBeOpened) {
+  ASSERT_EQ(mkfifo((depot_ + "pipe.mdl").c_str(), 0600), 0);
+  EXPECT_EQ(transfer("pipe.mdl", 2, {"a"}), 4u);
+  fs::create_symlink("/dev/null", depot_ + "null");
+  EXPECT_EQ(transfer("null", 2, {"a"}), 4u);
+  EXPECT_THAT(trace_.texts(RAS1_ERROR),
+              ElementsAre("Failed to open file " + depot_ + "pipe.mdl using mode \"a+b\", check permissions",
+                          "Failed to open file " + depot_ + "null using mode \"a+b\", check permissions"));
+}
+
 // ---- where it goes -------------------------------------------------------------------------------------------------
 
 TEST_F(BinaryDataTransferTest, MakesTheDirectoriesThatTheNameCallsFor) {

@@ -174,6 +174,10 @@ const BadRequest badRequests[] = {
     {"POST", "/v1/tables/ECHO/query", R"({"predicates":{"TEXT":"a\u0000"}})", 400, "bad_request", "TEXT"},
     {"POST", "/v1/tables/ECHO/query", R"({"predicates":{"NONE":"x"}})", 400, "unknown_column", "\"NONE\""},
     {"POST", "/v1/tables/ECHO/query", R"({"predicates":{"TEXT":{"is":"x"}}})", 400, "unknown_operator", "\"is\""},
+    {"POST", "/v1/tables/ECHO/query?TEXT=x", "{}", 400, "bad_request", "\"TEXT\""},
+    {"GET", "/v1?verbose", "", 400, "bad_request", "\"verbose\""},
+    {"GET", "/v1/tables?a=1&b=2", "", 400, "bad_request", "\"a\""},
+    {"GET", "/v1/depot/file?size", "", 400, "bad_request", "\"size\""},
     {"GET", "/v1/tables/ECHO/events?NONE=1", "", 400, "unknown_column", "\"NONE\""},
     {"GET", "/v1/tables/ECHO/events?TEXT.is=1", "", 400, "unknown_operator", "\"is\""},
     {"GET", "/v1/tables/ECHO/events?TEXT.=1", "", 400, "unknown_operator", "\"\""},
@@ -183,6 +187,7 @@ const BadRequest badRequests[] = {
     {"GET", "/v1/tables/ECHO/events?TEXT=%FF", "", 400, "bad_request", "TEXT"},
     {"POST", "/v1/tables/FAILS/query", R"({"predicates":{"TEXT":"create"}})", 500, "internal", "could not be queried"},
     {"POST", "/v1/tables/FAILS/query", R"({"predicates":{"TEXT":"sample"}})", 500, "internal", "told to fail"},
+    {"POST", "/v1/tables/FAILS/query", R"({"predicates":{"TEXT":"insert"}})", 500, "internal", "status 22"},
     {"GET", "/v1/tables/FAILS/events?TEXT=create", "", 500, "internal", "could not be watched"},
 };
 

@@ -201,6 +201,20 @@ TEST(PacketMemory, CallsWithoutRoomAreToldToComeAgain) {
   EXPECT_EQ("little ascii " + std::string(9000, 'y'), slow.receive().body);
 }
 
+TEST(PacketMemory, LengthAnnouncedBesidePiecesSaysNothing) {
+  const TestDaemon daemon({"maximum_packet_bytes = 10000", "packet_memory_bytes = 10000"});
+  const auto begin = [&](HttpClient& client) {
+    EXPECT_TRUE(client.send(std::string("POST ") + route +
+                            "0?version=3 HTTP/1.1\r\nHost: x\r\nExpect: 100-continue\r\n" + littleAscii +
+                            "Content-Length: 1\r\nTransfer-Encoding: chunked\r\n\r\n"));
+    return client.receiveInterim();
+  };
+  HttpClient first(daemon.socket());
+  ASSERT_EQ(100, begin(first));
+  HttpClient second(daemon.socket());
+  EXPECT_EQ(503, callOperation(second, 0, "x").status) << "the first may become as large as any";
+}
+
 TEST(PacketMemory, IsGivenBackByClientsThatLeave) {
   const TestDaemon daemon({"maximum_packet_bytes = 10000", "packet_memory_bytes = 10000"});
   for (int round = 0; round < 20; ++round) {

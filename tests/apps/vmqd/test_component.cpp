@@ -1,11 +1,11 @@
 // A component for the daemon's tests: tables that do what a test tells them to, all with the same columns.
-//   ECHO   answers with COUNT rows (one without it) that repeat the query's TEXT, numbered by NUMBER from 0 (or with
-//   the
+//   ECHO   answers with COUNT rows (one without it) that repeat the query's TEXT, numbered by NUMBER from 0 (or with the
 //          query's NUMBER when there is no COUNT); BYTES tells what TEXT asks for, see tell()
 //   GATE   opens the FIFO named by BYTES for reading, waits for its end and answers with one row
 //   EVENTS a query sends COUNT events, numbered by NUMBER, with its TEXT; whatever is open on the table gets those that
 //          pass its predicates, and so the query answers with them too
-//   FAILS  TEXT=create: no request can be opened; TEXT=sample: the sampling throws
+//   FAILS  TEXT=create: no request can be opened; TEXT=sample: the sampling throws; TEXT=insert: a row cannot be
+//          inserted
 // And the interface 5a000000-0000-0000-0000-000000000001, version 3, with the operations
 //   0 replies with the sender's label, a blank and the request
 //   1 raises the fault whose decimal number the request is
@@ -177,6 +177,7 @@ void sendEvents(TestRequest& request) {
 
 void fail(TestRequest& request) {
   if (request.predicate("TEXT") == "sample") throw std::runtime_error("told to fail");
+  if (request.predicate("TEXT") == "insert") (void)request.InsertRow(nullptr);
 }
 
 // ---- the interface -------------------------------------------------------------------------------------------------
