@@ -6,6 +6,7 @@ packages_build='g++ cmake ninja-build pkg-config libexpat1-dev libmicrohttpd-dev
 packages_run='curl ksh'
 packages_tests='libgtest-dev libgmock-dev libbenchmark-dev libyaml-cpp-dev'
 packages_fuzz='clang libclang-rt-14-dev'
+packages_coverage='gcovr'
 
 as_root() {
   if [ "$(id -u)" -eq 0 ]; then "$@"; else sudo "$@"; fi
