@@ -19,10 +19,9 @@ RAS1_Unit traceUnit{"process/waiter"};
 constexpr int kNotReaped = 255;
 constexpr int kSignalBase = 128;
 
+/// Of a child that has exited or that a signal has ended: one that is only stopped is not waited for.
 int exitCodeOf(int waitStatus) {
-  if (WIFEXITED(waitStatus)) return WEXITSTATUS(waitStatus);
-  if (WIFSIGNALED(waitStatus)) return kSignalBase + WTERMSIG(waitStatus);
-  return kNotReaped;
+  return WIFEXITED(waitStatus) ? WEXITSTATUS(waitStatus) : kSignalBase + WTERMSIG(waitStatus);
 }
 
 /// Returns when the child has ended, without reaping it: until the mutex is held its pid must stay its own, because

@@ -60,11 +60,11 @@ class TEST_RecordedWaits {
 };
 
 /// Makes one call of a service fail: the n-th from now on (n = 1: the next). Services are named like their functions,
-/// "FSI1_NewList"; the result is the given status (a null result for those that return pointers, 0 for
-/// XML1_ParseBuffer). Those that can fail so: BSS1_GetEnv (its default), BSS1_PutEnv, BSS1_GetLock, BSS1_ReleaseLock,
-/// FSI1_*, XML1_ParserCreate, XML1_GetBuffer, XML1_ParseBuffer (XML1_GetErrorCode then gives the status),
-/// NLS2_GetLocale, RegisterWithManager, InsertRow, Dispatch, rpc__register_mgr, rpc__malloc, rpc__alloc_pkt. What gives
-/// something back (BSS1_ReleaseLock, FSI1_DeleteList) has done so, and so has Dispatch: the rows that waited are gone.
+/// "FSI1_NewList"; the result is the given status (null for those that return pointers, 0 for XML1_ParseBuffer).
+/// These can: BSS1_GetEnv (its default), BSS1_PutEnv, BSS1_GetLock, BSS1_ReleaseLock, BSS1_InitializeOnce, FSI1_*,
+/// XML1_ParserCreate, XML1_GetBuffer, XML1_ParseBuffer (XML1_GetErrorCode then gives the status), NLS2_GetLocale,
+/// RegisterWithManager, InsertRow, Dispatch, rpc__register_mgr, rpc__malloc, rpc__alloc_pkt. What gives something back
+/// (BSS1_ReleaseLock, FSI1_DeleteList) has done so, and so has Dispatch: the rows that waited are gone.
 class TEST_FailCall {
  public:
   TEST_FailCall(const std::string& service, unsigned n, int status);

@@ -3,6 +3,7 @@
 #include <cerrno>
 
 #include "bss1.h"
+#include "seam.h"
 
 namespace {
 
@@ -21,6 +22,7 @@ void runPending() {
 }  // namespace
 
 int BSS1_InitializeOnce(BSS1_Once* once, void (*initialize)(void)) {
+  if (int status; vmqhost::seam::fails("BSS1_InitializeOnce", &status)) return status;
   if (once == nullptr || initialize == nullptr) return EINVAL;
   void (*const outer)() = pendingInitialize;  // an initialisation may itself need another
   pendingInitialize = initialize;

@@ -85,7 +85,8 @@ void prepareMachine(const InstallationHome& home) {
   home.tool("bin/um_console", atHome(home, "echo \"$4\" >> ~/console\ncase $4 in getdptype*) echo snmp ;; esac"));
   home.tool("zlpqor6/lx8266/bin/vmq_xa", atHome(home, kTranslator));
   home.tool("depot/install.sh", atHome(home, "echo \"$@\" > ~/installed"));
-  home.runAsFile(InstallationHome::runAs("lz", "other", "nobody"));
+  // Longer than the C library reads when it asks for the length: the reading itself can then fail.
+  home.runAsFile(InstallationHome::runAs("lz", "other", "nobody") + "<!--" + std::string(20000, '.') + "-->");
   home.file("depot/rc.txt", "0\n");
   home.file("depot/m.mdl", "model\n");
   home.file("depot/s1.sh", "one\n");

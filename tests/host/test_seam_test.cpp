@@ -197,6 +197,11 @@ constexpr ServiceCase kServices[] = {
        EXPECT_EQ(BSS1_GetLock(services.lock), 0);
        return BSS1_ReleaseLock(services.lock);
      }},
+    {"BSS1_InitializeOnce",
+     [](Services&) {
+       static BSS1_Once once = BSS1_ONCE_INIT;
+       return BSS1_InitializeOnce(&once, [] {});
+     }},
     {"FSI1_NewList",
      [](Services& services) {
        FSI1_List* list = nullptr;

@@ -12,7 +12,8 @@ constexpr char kPlatforms[] = "echo 'Platform codes:'; echo 'lx8266 Product (um)
 
 /// The console: the type it knows, and a body that sees the console command in $command.
 std::string console(const std::string& type, const std::string& body = "") {
-  return "command=$4\necho \"$command\" >> ~/console\ncase $command in getdptype*) echo '" + type + "' ;; esac\n" + body;
+  return "command=$4\necho \"$command\" >> ~/console\ncase $command in getdptype*) echo '" + type + "' ;; esac\n" +
+         body;
 }
 
 constexpr char kConfiguration[] =
@@ -81,13 +82,24 @@ std::vector<RequestDetail::Predicate> setting(const Asked& a) {
 }
 
 AnswerRow accepted(const Asked& a) {
-  return {.originnode = kNode, .transid = "t1", .command = "SETCONFIG", .product = a.product, .context = a.context,
-          .daconfig = a.model, .dascript = a.scripts, .targetmsn = a.target};
+  return {.originnode = kNode,
+          .transid = "t1",
+          .command = "SETCONFIG",
+          .product = a.product,
+          .context = a.context,
+          .daconfig = a.model,
+          .dascript = a.scripts,
+          .targetmsn = a.target};
 }
 
 StatusEvent ended(const Asked& a, int retval = 0, const std::string& id = "", const std::string& parameter = "") {
-  return {.originnode = kNode, .transid = "t1", .command = "SETCONFIG", .retval = retval, .retmsgid = id,
-          .retmsgparm = parameter, .targetmsn = a.target};
+  return {.originnode = kNode,
+          .transid = "t1",
+          .command = "SETCONFIG",
+          .retval = retval,
+          .retmsgid = id,
+          .retmsgparm = parameter,
+          .targetmsn = a.target};
 }
 
 std::string consoleCommand(const std::string& command) {
@@ -264,6 +276,8 @@ const DeploymentCase kSuccesses[] = {
              console("asfs"), {{"work/scripts/s1.sh", "one\n"}, {"work/scripts/s2.sh", "two\n"}}),
     succeeds("a type that is part of another in the list", {}, kReplaced, console("os"),
              {{"config/.ConfigData/kumenv", kStartup}}),
+    succeeds("a context with a port that is not told", {.context = "RESTART=,PORT="}, kReplaced,
+             console("asfs", "env | grep PORT > ~/surroundings"), {{"surroundings", "KUMP_DPCONSOLE_PORT=\n"}}),
     succeeds("the console's surroundings", {.context = " port=1920,restart=y "}, kReplaced,
              console("asfs", "env | grep -e ^KUM | sort > ~/surroundings"),
              {{"surroundings", "KUMP_DPCONSOLE_NOCONFIRM=Y\nKUMP_DPCONSOLE_PORT=1920\nKUMP_RB_PATH=~/rb\n"
@@ -291,6 +305,15 @@ const DeploymentCase kOddMachines[] = {
     configured(succeeds("an agent that starts with no provider yet", {}, kReplacedAfterRestart, console("snmp"),
                         {{"config/.ConfigData/kumenv", "ux|DATAPROVIDER|none|\n\ninst1|DATAPROVIDER|,SNMP|\nlast\n"}}),
                "KUMP_META_PATH=~/meta\nKUM_WORK_PATH=~/work/um\nKUMP_RB_PATH=~/rb\n"),
+    configured(succeeds("a type that the one provider serves, where the agent starts without that", {},
+                        kReplacedAfterRestart, console("file"),
+                        {{"config/.ConfigData/kumenv",
+                          "ux|DATAPROVIDER|none|\n\ninst1|DATAPROVIDER|post,FILE|\nlast\n"}}),
+               "KUMP_META_PATH=~/meta\nKUM_WORK_PATH=~/work/um\nKUMP_RB_PATH=~/rb\nKUMA_STARTUP_DP=post\n"),
+    withFile(succeeds("a list of start-up providers whose last line has no end", {}, kReplacedAfterRestart,
+                      console("snmp"),
+                      {{"config/.ConfigData/kumenv", "ux|DATAPROVIDER|none|\ninst1|DATAPROVIDER|asfs,post,SNMP|\n"}}),
+             "config/.ConfigData/kumenv", "ux|DATAPROVIDER|none|\ninst1|DATAPROVIDER|asfs,post|"),
     withFile(withFile(succeeds("an agent without an instance is listed by its architecture", {.target = "node7:DA"},
                                {kAskPlatforms, consoleCommand("getdptype"), "~/bin/CorvelAgent  -h ~ -c stop um",
                                 "~/bin/CorvelAgent  -h ~ start um", consoleCommand("DELETE"), consoleCommand("IMPORT")},
@@ -338,8 +361,8 @@ TEST_F(DataAgentDeployment, TracesEachStepOfANewType) {
   for (const char* line :
        {"Context [] port (optional) [] restart (1=true) [0]",
         "DA Configuration file is \"~/config/um_inst1.config\", instance (optional) is \"inst1\"",
-        "DA Base Dir is [~/zlpqor6/lx8266/um]", "DA Bin Dir is [~/zlpqor6/lx8266/um/bin/]", "DA Work Dir is [~/work/um]",
-        "DA Scripts Dir is [~/work/scripts]", "DA RB Dir is [~/rb]",
+        "DA Base Dir is [~/zlpqor6/lx8266/um]", "DA Bin Dir is [~/zlpqor6/lx8266/um/bin/]",
+        "DA Work Dir is [~/work/um]", "DA Scripts Dir is [~/work/scripts]", "DA RB Dir is [~/rb]",
         "Environment variable 1 - KUM_PRODSPEC_PATH=~/meta/", "Environment variable 2 - KUMP_RB_PATH=~/rb",
         "Environment variable 3 - KUMP_DPCONSOLE_PORT=", "Environment variable 4 - KUM_DP_HOSTNAME=node7",
         "Environment variable 5 - KUMP_DPCONSOLE_NOCONFIRM=Y", "DPTYPE for metafile [m.mdl] is [SNMP]",
@@ -376,6 +399,12 @@ TEST_F(DataAgentDeployment, TracesTheModeOfACopiedScript) {
 TEST_F(DataAgentDeployment, TracesThatTheAgentStartsWithNoProvider) {
   run(kOddMachines[2]);
   EXPECT_TRUE(trace.has(RAS1_DETAIL, "No value found for KUMA_STARTUP_DP"));
+}
+
+TEST_F(DataAgentDeployment, WorkDirectoryUnderTheRootHasItsScriptsThereToo) {
+  run(configured(succeeds("a work directory under the root", {}, kReplaced, console("asfs"), {}),
+                 "KUMP_META_PATH=~/meta\nKUM_WORK_PATH=/um\nKUMP_RB_PATH=~/rb\nKUMA_STARTUP_DP=asfs\n"));
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "DA Scripts Dir is [/scripts]"));
 }
 
 TEST_F(DataAgentDeployment, TracesThatTheListOfStartupProvidersIsEmpty) {

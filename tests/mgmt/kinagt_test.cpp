@@ -8,6 +8,7 @@
 
 #include "test_seam.h"
 #include "tests/mgmt/running_component.h"
+#include "tests/support/failing_allocation.h"
 
 namespace {
 
@@ -257,6 +258,19 @@ TEST_F(InventoryTable, ToolEndedByASignalGivesNoRows) {
   home.file("listing", kHeader + line(kUnix));
   home.tool("bin/qinfo", "cat '" + home.path() + "/listing'; kill -9 $$");
   EXPECT_THAT(ask(), IsEmpty());
+}
+
+TEST_F(InventoryTable, ListingThatDoesNotFitIntoMemoryGivesNoRowsAndTheNextQueryAll) {
+  const std::string listing = kHeader + line(kUnix) + std::string(100000, 'x');
+  inventory("-x", kHeader);
+  inventory("-d", listing);
+  {
+    const FailingAllocation failing(listing.size());
+    EXPECT_THAT(ask(), IsEmpty());
+    EXPECT_TRUE(failing.happened());
+  }
+  EXPECT_TRUE(trace.has(RAS1_ERROR, "Exception while listing the installed products: std::bad_alloc"));
+  EXPECT_THAT(ask(), ElementsAre(row(kUnix)));
 }
 
 TEST_F(InventoryTable, DescriptionOfBlanksOnlyIsNone) {

@@ -56,6 +56,15 @@ TEST_F(ProcessFailures, RefusedStartIsToldAndLeavesNothingBehind) {
   }
 }
 
+TEST_F(ProcessFailures, ChildThatNothingCouldWaitForIsReapedInSpiteOfAnInterruption) {
+  const SystemFault noWaiter(SystemCall::kPthreadCreate, EAGAIN);
+  const SystemFault interrupted(SystemCall::kWaitpid, EINTR);
+  Process process(scriptThatWaits().c_str());
+  EXPECT_FALSE(process.start());
+  EXPECT_TRUE(interrupted.happened());
+  EXPECT_EQ(ProcessResources::now().children, 0u);
+}
+
 TEST_F(ProcessFailures, RefusedStartCanBeTriedAgain) {
   Process process("/bin/true");
   {

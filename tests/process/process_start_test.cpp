@@ -198,6 +198,15 @@ TEST_F(BareName, DirectoryThatMayNotBeSearchedIsToldOverMissingOnes) {
   EXPECT_TRUE(traces.has(RAS1_ERROR, "Error occurred. ERRNO:13 Permission denied"));
 }
 
+TEST_F(BareName, ProgramThatIsThereButCannotBeExecutedEndsTheSearch) {
+  directory.writeScript("first/tool", "echo first\n");
+  const std::string setting = "PATH=" + (directory / "first") + ":" + elsewhere_;
+  const char* env[] = {setting.c_str(), nullptr};
+  const TEST_TraceCapture traces;
+  EXPECT_EQ(outputOf("tool " + std::string(200000, 'x'), env), "");  // a longer argument than the system takes
+  EXPECT_TRUE(traces.has(RAS1_ERROR, "Error occurred. ERRNO:7 Argument list too long"));
+}
+
 TEST_F(ProcessStart, ListIsAddedToTheHostsEnvironment) {
   const ScopedVariable host("VMQ_HOST", "kept");
   const ScopedVariable replaced("VMQ_REPLACED", "old");

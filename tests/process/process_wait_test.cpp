@@ -261,6 +261,13 @@ TEST_F(ProcessWait, WaiterTracesWhatItCannotLockSignalOrUnlock) {
   }
 }
 
+TEST_F(ProcessWait, CompletionThatCannotBeAnnouncedIsTracedAndWaitedFor) {
+  const TEST_TraceCapture traces;
+  const SystemFault fault(SystemCall::kWrite, EIO);
+  EXPECT_EQ(statusOf(script("exit 3")), 3);
+  EXPECT_TRUE(traces.has(RAS1_ERROR, "Error occurred. ERRNO:5 Input/output error"));
+}
+
 TEST_F(ProcessWait, WaitThatCannotBeTimedGoesOnWithoutTime) {
   const TEST_TraceCapture traces;
   Process process(script("sleep 0.1; exit 3").c_str());

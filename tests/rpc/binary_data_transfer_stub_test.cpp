@@ -266,6 +266,13 @@ TEST_F(StubTest, CountsThatLieAreAFaultBeforeAnyMemoryIsTaken) {
       RAS1_ERROR, "A packet is refused: maximum count 1, actual count 2, last block index 0, 8200 bytes of blocks"));
 }
 
+TEST_F(StubTest, WithoutMarshallingDataThePacketIsNotRead) {
+  const TEST_FailCall failing("BSS1_InitializeOnce", 1, EAGAIN);
+  EXPECT_EQ(call(littlePacket(), littleAscii).fault, uint32_t{rpc__fault_unspecified});
+  EXPECT_FALSE(received);
+  EXPECT_THAT(memory_.taken(), IsEmpty());
+}
+
 TEST_F(StubTest, WithoutMemoryForTheBlocks) {
   const TEST_FailCall failing("rpc__malloc", 1, 0);
   EXPECT_EQ(call(littlePacket(), littleAscii).fault, uint32_t{rpc__fault_no_memory});

@@ -276,11 +276,31 @@ WRAP(int, fstat, int descriptor, struct stat* status) {
 }
 
 WRAP(int, mkdir, const char* path, mode_t mode) {
-  return orErrno(SystemCall::kMkdir, -1, [&] { return __real_mkdir(path, mode); });
+  const int error = strike(SystemCall::kMkdir);
+  if (error == 0) return __real_mkdir(path, mode);
+  if (error == EEXIST) (void)__real_mkdir(path, mode);
+  errno = error;
+  return -1;
 }
 
 WRAP(int, chmod, const char* path, mode_t mode) {
   return orErrno(SystemCall::kChmod, -1, [&] { return __real_chmod(path, mode); });
+}
+
+WRAP(int, fchmod, int descriptor, mode_t mode) {
+  return orErrno(SystemCall::kFchmod, -1, [&] { return __real_fchmod(descriptor, mode); });
+}
+
+WRAP(int, fchown, int descriptor, uid_t owner, gid_t group) {
+  return orErrno(SystemCall::kFchown, -1, [&] { return __real_fchown(descriptor, owner, group); });
+}
+
+WRAP(int, fsync, int descriptor) {
+  return orErrno(SystemCall::kFsync, -1, [&] { return __real_fsync(descriptor); });
+}
+
+WRAP(int, rename, const char* from, const char* to) {
+  return orErrno(SystemCall::kRename, -1, [&] { return __real_rename(from, to); });
 }
 
 WRAP(int, unlink, const char* path) {

@@ -32,9 +32,13 @@ enum class SystemCall {
   kExecve,
   // Files and directories.
   kAccess,
-  kStat,  ///< lstat and fstat too
-  kMkdir,
+  kStat,   ///< lstat and fstat too
+  kMkdir,  ///< with EEXIST it is made all the same, as when somebody else was faster
   kChmod,
+  kFchmod,
+  kFchown,
+  kFsync,
+  kRename,
   kUnlink,
   kLink,
   kUname,

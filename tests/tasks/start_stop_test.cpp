@@ -7,6 +7,7 @@
 #include <cstdlib>
 #include <filesystem>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "test_seam.h"
@@ -261,6 +262,15 @@ TEST(RemovedVariable, IsTheOnlyOneThatGoes) {
   removeVariable("B");
   EXPECT_THAT(OwnEnvironment::entries(), ElementsAre("A=1", "C=3"));
   EXPECT_THAT(trace.texts(RAS1_ERROR), ElementsAre("found a match for env variable [B=2] "));
+}
+
+TEST(RemovedVariable, IsNotMissedWhereThereIsNoEnvironmentAtAll) {
+  TEST_TraceCapture trace;
+  char** const before = std::exchange(environ, nullptr);  // as clearenv leaves it
+  removeVariable("B");
+  EXPECT_EQ(environ, nullptr);
+  environ = before;
+  EXPECT_THAT(trace.texts(RAS1_ERROR), IsEmpty());
 }
 
 TEST(RemovedVariable, MayBeTheFirstTheLastOrTheOnlyOne) {

@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <cerrno>
+#include <optional>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -11,6 +12,7 @@
 #include "bss1.h"
 #include "tasks/task_queue.h"
 #include "test_seam.h"
+#include "tests/support/failing_allocation.h"
 #include "tests/tasks/failing_calls.h"
 #include "tests/tasks/installation_home.h"
 #include "tests/tasks/recorded_tasks.h"
@@ -413,6 +415,21 @@ TEST_P(ImmediateTaskThatThrows, IsAnsweredAllTheSame) {
 INSTANTIATE_TEST_SUITE_P(All, ImmediateTaskThatThrows,
                          testing::Values(Failure{"GETCONFIG", TASK_TRANSLATOR_NOT_STARTED, "VMQ1009E"},
                                          Failure{"COMPLETE_INSTALL", TASK_INSTALL_FAILED, "VMQ1031E"}));
+
+TEST_F(InitializedTaskManager, ThrownTaskWithoutMemoryForItsMessageKeepsItsCode) {
+  const std::string product(5000, 'p');
+  std::optional<FailingAllocation> failing;
+  tasks.behaviour = [&](TaskQueueElem&) -> TASK_RC {
+    failing.emplace(product.size());
+    throw std::runtime_error("no more of it");
+  };
+  TaskQueueElem request = Parameters{.command = "INSTALL", .product = product}.request();
+  EXPECT_EQ(processAsyncTask(request), TASK_INSTALL_NOT_STARTED);
+  EXPECT_TRUE(failing->happened());
+  EXPECT_TRUE(trace.has(RAS1_ERROR, "Exception while INSTALL: no more of it"));
+  EXPECT_TRUE(trace.has(RAS1_ERROR, "Exception while writing the message of a failed task: std::bad_alloc"));
+  EXPECT_EQ(request.retmsgparm.length(), 0u);
+}
 
 TEST_F(InitializedTaskManager, ExceptionOfUnknownKindIsTracedToo) {
   tasks.behaviour = [](TaskQueueElem&) -> TASK_RC { throw 42; };

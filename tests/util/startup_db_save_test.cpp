@@ -1,8 +1,10 @@
 // The run-as database, written to its file.
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <csignal>
 #include <filesystem>
@@ -198,6 +200,27 @@ TEST_F(StartupDBSaveTest, FileThatCannotBeOpenedIsAFailure) {
     EXPECT_TRUE(trace_.has(RAS1_ERROR, "Error opening file, " + path + ", in write mode: %"));
     EXPECT_EQ(database.getNumAgents(), 1u);
   }
+}
+
+TEST_F(StartupDBSaveTest, NameThatLeavesNoRoomForTheFileBesideIsAFailureAndTheFileStays) {
+  const std::string name(250, 'n');
+  const std::string contents = "<r><agent><productCode>um</productCode></agent></r>";
+  const std::string path = directory_.writeFile(name, contents);
+  EXPECT_FALSE(open(path).save());
+  EXPECT_TRUE(trace_.has(RAS1_ERROR, "Error opening file, " + path + ", in write mode: %"));
+  EXPECT_EQ(readWholeFile(path), contents);
+  EXPECT_EQ(files(), 1);
+}
+
+TEST_F(StartupDBSaveTest, FileWithoutANameAnyMoreIsAFailure) {
+  const int descriptor = ::open(directory_.writeFile("gone", "<r/>").c_str(), O_RDWR | O_CLOEXEC);
+  ASSERT_GE(descriptor, 0);
+  fs::remove(directory_ / "gone");
+  const std::string path = "/proc/self/fd/" + std::to_string(descriptor);
+  EXPECT_FALSE(open(path).save());
+  EXPECT_TRUE(trace_.has(RAS1_ERROR, "Error opening file, " + path + ", in write mode: %"));
+  EXPECT_EQ(files(), 0);
+  close(descriptor);
 }
 
 TEST_F(StartupDBSaveTest, ValueThatCouldNotBeReadBackIsRefusedAndTheFileStays) {
