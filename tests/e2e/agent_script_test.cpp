@@ -2,10 +2,12 @@
 
 #include <gmock/gmock.h>
 #include <signal.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <filesystem>
 #include <fstream>
+#include <stdexcept>
 
 #include "tests/e2e/loopback.h"
 #include "tests/e2e/sample_home.h"
@@ -31,8 +33,12 @@ class AgentScript : public testing::Test {
         execl("/bin/sleep", "sleep", "1000", nullptr);
         _exit(127);
       }
+      if (pid < 0) throw std::runtime_error("no child");  // the signal for it would be one for everybody
     }
-    ~Bystander() { kill(pid, SIGKILL); }
+    ~Bystander() {
+      kill(pid, SIGKILL);
+      waitpid(pid, nullptr, 0);
+    }
     const pid_t pid;
   };
 
@@ -132,14 +138,23 @@ TEST_F(AgentScript, ProcessThatDoesNotLookLikeAnAgentIsLeftAlone) {
   EXPECT_TRUE(isRunning(bystander.pid));
 }
 
+// What they name is nobody or the bystander: a script that believed them would do no harm to others.
 TEST_F(AgentScript, StalePidFileDoesNotKeepTheAgentFromStarting) {
+  const Bystander bystander;
+  const std::string other = std::to_string(bystander.pid);
   fs::create_directories(home / "run");
-  for (const char* stale : {"", "\n", "1\n", "1 1\n", "-1 1\n", "self 1\n", "999999999 12\n", "1 2 3\n", "../1 x"}) {
+  for (const std::string& stale : {std::string(), std::string("\n"), other + "\n", other + " 1\n",
+                                   std::string("-999999999 1\n"), std::string("self 1\n"),
+                                   std::string("999999999 12\n"), other + " 2 3\n", "../" + other + " x"}) {
     SCOPED_TRACE(stale);
     std::ofstream(home / "run/ux.pid") << stale;
+    EXPECT_EQ(home.control("status ux").exit_code, 3);
     succeed("start ux");
     EXPECT_TRUE(answers(home.port("ux")));
     succeed("-c stop ux");
+    std::ofstream(home / "run/ux.pid") << stale;
+    succeed("-c stop ux");
+    EXPECT_TRUE(isRunning(bystander.pid));
   }
 }
 

@@ -1,6 +1,6 @@
 // Agents that run as another user, as the file config/HOST_vmqrunas.cfg says.
 
-#include <pwd.h>
+#include <sys/mount.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -9,10 +9,40 @@
 
 #include "tests/e2e/deployment.h"
 #include "tests/e2e/loopback.h"
+#include "tests/support/scratch_file_system.h"
 
 namespace {
 
 namespace fs = std::filesystem;
+
+/// A user whom only this process and its children know, by an /etc/passwd of their own: nobody else's login files are
+/// run. Where that cannot be had it is root, as whom a process of root's may run anything too.
+class OwnUser {
+ public:
+  OwnUser() {
+    if (geteuid() != 0 || !canMount()) return;
+    useOwnMountTable();
+    const std::string line = "vmq-test:*:54321:54321::" + directory_.path().string() + ":/bin/sh\n";
+    const std::string accounts = directory_.writeFile("passwd", readWholeFile("/etc/passwd") + line);
+    mounted_ = mount(accounts.c_str(), "/etc/passwd", nullptr, MS_BIND, nullptr) == 0;
+    fs::permissions(directory_.path(), fs::perms(0755));
+    fs::permissions(accounts, fs::perms(0644));
+  }
+  ~OwnUser() {
+    if (mounted_) {
+      EXPECT_EQ(umount2("/etc/passwd", MNT_DETACH), 0);
+    }
+  }
+  OwnUser(const OwnUser&) = delete;
+  OwnUser& operator=(const OwnUser&) = delete;
+
+  [[nodiscard]] std::string name() const { return mounted_ ? "vmq-test" : "root"; }
+  [[nodiscard]] uid_t id() const { return mounted_ ? 54321 : 0; }
+
+ private:
+  const TemporaryDirectory directory_;
+  bool mounted_ = false;
+};
 
 class RunAs : public Deployment {
  protected:
@@ -42,28 +72,13 @@ class RunAs : public Deployment {
 
   Json start() { return carryOut({{"COMMAND", "START"}, {"TRANSID", "t1"}, {"PRODUCT", "ux"}}); }
 
-  /// Someone as whom `su -` runs commands: not root where the machine has such a user, else root; nobody when this
-  /// process is not root and so would be asked for a password.
-  static std::string userWithShell() {
-    if (geteuid() != 0) return "";
-    std::string found = "root";
-    setpwent();
-    while (const passwd* entry = getpwent()) {
-      const std::string user = entry->pw_name;
-      if (entry->pw_uid == 0 || !std::string(entry->pw_shell).ends_with("sh")) continue;
-      if (runShell("/usr/bin/su - " + user + " -c true </dev/null").exit_code != 0) continue;
-      found = user;
-      break;
-    }
-    endpwent();
-    return found;
-  }
-
   /// Whether the agent got the daemon's environment, which `su -` does not pass on.
   [[nodiscard]] bool environmentIsTheDaemons() const {
     return readWholeFile("/proc/" + std::to_string(home.pid("ux").value()) + "/environ").find("CORVELHOME=") !=
            std::string::npos;
   }
+
+  const OwnUser own_user;  // known before the daemon starts, which then knows it too
 };
 
 TEST_F(RunAs, WithoutAFileTheAgentRunsAsTheDaemonsUser) {
@@ -110,19 +125,17 @@ TEST_F(RunAs, UserWithoutALoginShellFailsTheStop) {
 }
 
 TEST_F(RunAs, AgentRunsAsTheUserNamedForIt) {
-  const std::string user = userWithShell();
-  if (user.empty()) {
-    nameUser("root");
-    EXPECT_THAT(start(), Failed(1024, wrapped("root", "start ux"))) << "su ran without a password";
+  nameUser(own_user.name());
+  if (geteuid() != 0) {
+    EXPECT_THAT(start(), Failed(1024, wrapped(own_user.name(), "start ux"))) << "su ran without a password";
     return;
   }
-  nameUser(user);
   ASSERT_THAT(start(), Succeeded());
   EXPECT_TRUE(answers(home.port("ux")));
   EXPECT_FALSE(environmentIsTheDaemons());
   struct stat process {};
   ASSERT_EQ(stat(("/proc/" + std::to_string(home.pid("ux").value())).c_str(), &process), 0);
-  EXPECT_EQ(process.st_uid, getpwnam(user.c_str())->pw_uid) << user;
+  EXPECT_EQ(process.st_uid, own_user.id());
 
   EXPECT_THAT(carryOut({{"COMMAND", "STOP"}, {"TRANSID", "t2"}, {"PRODUCT", "ux"}}), Succeeded());
   EXPECT_FALSE(answers(home.port("ux")));

@@ -8,6 +8,7 @@
 #include <filesystem>
 #include <fstream>
 #include <sstream>
+#include <stdexcept>
 #include <thread>
 
 #include "tests/e2e/loopback.h"
@@ -66,7 +67,7 @@ std::string SampleHome::writeProgram(const std::string& name, const std::string&
 std::optional<pid_t> SampleHome::pid(const std::string& agent) const {
   std::ifstream file(*this / ("run/" + agent + ".pid"));
   pid_t pid = 0;
-  if (!(file >> pid)) return std::nullopt;
+  if (!(file >> pid) || pid <= 1) return std::nullopt;
   return pid;
 }
 
@@ -102,6 +103,8 @@ bool soon(const std::function<bool()>& question) {
 }
 
 unsigned signalEveryProcessNaming(const std::string& text, int signal) {
+  if (text.find("/vmq-test-") == std::string::npos)
+    throw std::invalid_argument("not in a temporary directory of a test: \"" + text + "\"");
   unsigned found = 0;
   for (const auto& entry : fs::directory_iterator("/proc")) {
     const std::string name = entry.path().filename();

@@ -51,5 +51,5 @@ bool isRunning(pid_t pid);
 bool soon(const std::function<bool()>& question);
 
 /// Sends a signal to every process with this text in its command line, and returns how many there were. For texts that
-/// nothing else can hold: paths of a temporary directory.
+/// nothing else can hold: paths of a temporary directory. Throws std::invalid_argument for any other.
 unsigned signalEveryProcessNaming(const std::string& text, int signal);

@@ -250,8 +250,12 @@ TEST(TraceLog, DoesNotTakeThePlaceOfAClosedStandardStream) {
   ASSERT_GE(child, 0);
   if (child == 0) {
     close(STDIN_FILENO);
-    const TraceLog log("all");
-    _exit(fcntl(STDIN_FILENO, F_GETFD) < 0 && errno == EBADF ? 0 : 1);
+    bool closed = false;
+    {
+      const TraceLog log("all");
+      closed = fcntl(STDIN_FILENO, F_GETFD) < 0 && errno == EBADF;
+    }
+    _exit(closed ? 0 : 1);
   }
   int status = -1;
   ASSERT_EQ(waitpid(child, &status, 0), child);

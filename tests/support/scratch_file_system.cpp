@@ -9,6 +9,7 @@
 
 #include <cerrno>
 #include <filesystem>
+#include <system_error>
 #include <utility>
 
 namespace {
@@ -48,14 +49,17 @@ bool canMount() {
 }
 
 void useOwnMountTable() {
-  ASSERT_TRUE(separateMounts());
+  if (!separateMounts()) throw std::system_error(errno, std::generic_category(), "no mount table of its own");
 }
 
-ScratchFileSystem::ScratchFileSystem(std::string directory, unsigned kibibytes) : directory_(std::move(directory)) {
+// Throws, so that no test fills what lies under a file system that is not there.
+ScratchFileSystem::ScratchFileSystem(std::string directory, unsigned kibibytes)
+    : directory_(std::move(directory)), bytes_(kibibytes * size_t{1024}) {
   useOwnMountTable();
   std::filesystem::create_directories(directory_);
   const std::string options = "size=" + std::to_string(kibibytes) + "k";
-  EXPECT_EQ(mount("none", directory_.c_str(), "tmpfs", MS_NOSUID | MS_NODEV, options.c_str()), 0) << directory_;
+  if (mount("none", directory_.c_str(), "tmpfs", MS_NOSUID | MS_NODEV, options.c_str()) != 0)
+    throw std::system_error(errno, std::generic_category(), "no file system in " + directory_);
 }
 
 ScratchFileSystem::~ScratchFileSystem() {
@@ -66,10 +70,13 @@ void ScratchFileSystem::fill() const {
   const int file = open((directory_ + "/filler").c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0600);
   ASSERT_GE(file, 0);
   const char block[512] = {};
-  while (::write(file, block, sizeof block) > 0) {
-  }
-  EXPECT_EQ(errno, ENOSPC);
+  size_t written = 0;
+  ssize_t count = 0;
+  while (written < 2 * bytes_ && (count = ::write(file, block, sizeof block)) > 0) written += static_cast<size_t>(count);
+  const int error = errno;
   close(file);
+  ASSERT_LT(count, 0) << "twice its size fits into " << directory_;
+  EXPECT_EQ(error, ENOSPC);
 }
 
 void ScratchFileSystem::makeReadOnly() const {
