@@ -34,7 +34,8 @@ bool areSame(const Outcome& one, const Outcome& other) {
          a.home == b.home && a.variables == b.variables && a.allowed_uids == b.allowed_uids &&
          a.event_buffer_rows == b.event_buffer_rows && a.maximum_request_bytes == b.maximum_request_bytes &&
          a.maximum_packet_bytes == b.maximum_packet_bytes && a.packet_memory_bytes == b.packet_memory_bytes &&
-         a.maximum_connections == b.maximum_connections && a.stop_seconds == b.stop_seconds && a.places == b.places;
+         a.maximum_connections == b.maximum_connections && a.client_seconds == b.client_seconds &&
+         a.stop_seconds == b.stop_seconds && a.places == b.places;
 }
 
 std::string withDosLineEnds(const std::string& text) {
@@ -47,7 +48,9 @@ void requireLimits(const vmqd::Configuration& configuration) {
   fuzz::require(!configuration.home.empty() && configuration.home.front() == '/', "the home is an absolute path");
   fuzz::require(configuration.socket.front() == '/' && configuration.socket.size() < 108, "the socket has an address");
   fuzz::require(configuration.packet_memory_bytes >= configuration.maximum_packet_bytes, "a packet has room");
-  fuzz::require(configuration.maximum_connections >= 4 && configuration.event_buffer_rows >= 1, "numbers have limits");
+  fuzz::require(configuration.maximum_connections >= 4 && configuration.event_buffer_rows >= 1 &&
+                    configuration.client_seconds >= 1 && configuration.client_seconds <= 24 * 3600,
+                "numbers have limits");
   for (const auto& [name, value] : configuration.variables) {
     fuzz::require(!name.empty() && name.find_first_of(std::string_view("=\0", 2)) == std::string::npos &&
                       value.find('\0') == std::string::npos,

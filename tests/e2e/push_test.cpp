@@ -2,7 +2,9 @@
 
 #include <sys/stat.h>
 
+#include <csignal>
 #include <filesystem>
+#include <functional>
 #include <future>
 #include <map>
 #include <random>
@@ -32,6 +34,17 @@ class PushTest : public Deployment {
   /// True when the file in the depot holds these bytes (which may be too many to be shown).
   [[nodiscard]] bool holds(const std::string& name, const std::string& bytes) const {
     return readWholeFile(inDepot(name)) == bytes;
+  }
+
+  /// Kills the daemon where the condition holds: it stands still while it is looked at.
+  void killDaemonWhere(const std::function<bool()>& condition) {
+    ASSERT_TRUE(soon([&] {
+      daemon->process().signal(SIGSTOP);
+      if (condition()) return true;
+      daemon->process().signal(SIGCONT);
+      return false;
+    })) << "the push was over before that";
+    daemon->kill();
   }
 
   TemporaryDirectory source_;
@@ -169,8 +182,10 @@ TEST_F(PushTest, ThatADaemonDidNotSurviveIsRepeated) {
   const std::string bytes = randomBytes(std::size_t{16} << 20, 1);
   const std::string file = quoted(source_.writeFile("a", bytes));
   auto push = std::async(std::launch::async, [&] { return vmqctl("push " + file); });
-  ASSERT_TRUE(soon([&] { return fs::exists(inDepot("a")) && fs::file_size(inDepot("a")) > 100000; }));
-  daemon->kill();
+  ASSERT_NO_FATAL_FAILURE(killDaemonWhere([&] {
+    const std::uintmax_t arrived = fs::exists(inDepot("a")) ? fs::file_size(inDepot("a")) : 0;
+    return arrived > 100000 && arrived < bytes.size();
+  }));
   const Outcome broken = push.get();
   EXPECT_EQ(broken.exit_code, 7) << broken.output;
   EXPECT_THAT(broken.output, HasSubstr(" of 4096: "));
@@ -197,8 +212,8 @@ TEST_F(PushTest, ThatADaemonDidNotSurviveAmidAConversionIsRepeated) {
   const std::string file = quoted(source_.writeFile("install.sh", written));
   auto push = std::async(std::launch::async, [&] { return vmqctl("push " + file); });
   // Each piece converts all that was there before it, so most of the time is that.
-  ASSERT_TRUE(soon([&] { return fs::exists(home / "tmp/.vmqtemp") && fs::exists(inDepot("install.sh")); }));
-  daemon->kill();
+  ASSERT_NO_FATAL_FAILURE(
+      killDaemonWhere([&] { return fs::exists(home / "tmp/.vmqtemp") && fs::exists(inDepot("install.sh")); }));
   EXPECT_EQ(push.get().exit_code, 7);
 
   daemon->start();

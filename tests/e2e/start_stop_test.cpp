@@ -124,26 +124,17 @@ TEST_F(StartStop, RestartWhoseStopFailsSucceedsAndStillTellsOfTheStop) {
 
 TEST_F(StartStop, RequestsRunOneAfterTheOtherInTheOrderOfTheirArrival) {
   Watcher watcher(daemon->socket());
+  const auto began = std::chrono::steady_clock::now();
   ASSERT_THAT(ask({{"COMMAND", "START"}, {"TRANSID", "first"}, {"PRODUCT", "ux"}}), Succeeded());
   ASSERT_THAT(ask({{"COMMAND", "STOP"}, {"TRANSID", "second"}, {"PRODUCT", "ux"}}), Succeeded());
   const Json first = watcher.next();
-  const auto told = std::chrono::steady_clock::now();
   const Json second = watcher.next();
   EXPECT_EQ(first["TRANSID"], "first");
   EXPECT_THAT(first, Succeeded());
   EXPECT_EQ(second["TRANSID"], "second");
   EXPECT_THAT(second, Succeeded());
-  EXPECT_GE(std::chrono::steady_clock::now() - told, std::chrono::milliseconds(900))
-      << "a second lies before each event";
+  EXPECT_GE(std::chrono::steady_clock::now() - began, std::chrono::seconds(2)) << "a second lies before each event";
   EXPECT_FALSE(answers(home.port("ux")));
-}
-
-TEST_F(StartStop, WatcherThatDoesNotReadHoldsUpNobodyAndMissesNothing) {
-  Watcher idle(daemon->socket());
-  EXPECT_THAT(carryOut({{"COMMAND", "START"}, {"TRANSID", "t1"}, {"PRODUCT", "ux"}}), Succeeded());
-  EXPECT_THAT(carryOut({{"COMMAND", "STOP"}, {"TRANSID", "t2"}, {"PRODUCT", "ux"}}), Succeeded());
-  EXPECT_EQ(idle.next()["TRANSID"], "t1");
-  EXPECT_EQ(idle.next()["TRANSID"], "t2");
 }
 
 TEST_F(StartStop, WatcherThatGoesAwayHoldsUpNobody) {

@@ -122,6 +122,12 @@ struct Fails {
 };
 
 // clang-format off
+const Fails kEmptyStartup =
+    {.situation = "an empty list of start-up providers", .retval = 1028,
+     .parameter = "~/config/.ConfigData/kumenv,asfs,post,SNMP",
+     .commands = {kAskPlatforms, consoleCommand("getdptype"), kStop}, .tools = tools(console("snmp")),
+     .files = files({{"config/.ConfigData/kumenv", ""}})};
+
 const Fails kFailures[] = {
     {.situation = "no configuration file for the instance as it is, nor in lower case", .retval = 1020,
      .parameter = "~/config/um_inst9.config,inst9", .asked = {.target = "Inst9:node7:DA"},
@@ -223,21 +229,21 @@ const Fails kFailures[] = {
     {.situation = "a control script that cannot be run", .retval = 1027, .parameter = "inst1",
      .commands = {kAskPlatforms, consoleCommand("getdptype"), kStop},
      .tools = {{"bin/qinfo", kPlatforms}, {"bin/um_console", console("snmp")}}},
-    {.situation = "an empty list of start-up providers", .retval = 1028,
-     .parameter = "~/config/.ConfigData/kumenv,asfs,post,SNMP",
-     .commands = {kAskPlatforms, consoleCommand("getdptype"), kStop}, .tools = tools(console("snmp")),
-     .files = files({{"config/.ConfigData/kumenv", ""}})},
+    kEmptyStartup,
 };
+
+DeploymentCase fails(const Fails& f) {
+  const std::string id = "VMQ" + std::to_string(f.retval) + "E";
+  DeploymentCase failing = {.situation = f.situation, .request = setting(f.asked), .tools = f.tools, .files = f.files,
+                            .commands = f.commands, .answer = accepted(f.asked),
+                            .events = {ended(f.asked, f.retval, id, f.parameter)}};
+  for (const std::string& error : f.errors) failing.errors.push_back(id + " " + error);
+  return failing;
+}
 
 std::vector<DeploymentCase> failures() {
   std::vector<DeploymentCase> cases;
-  for (const Fails& f : kFailures) {
-    const std::string id = "VMQ" + std::to_string(f.retval) + "E";
-    cases.push_back({.situation = f.situation, .request = setting(f.asked), .tools = f.tools, .files = f.files,
-                     .commands = f.commands, .answer = accepted(f.asked),
-                     .events = {ended(f.asked, f.retval, id, f.parameter)}});
-    for (const std::string& error : f.errors) cases.back().errors.push_back(id + " " + error);
-  }
+  for (const Fails& each : kFailures) cases.push_back(fails(each));
   return cases;
 }
 
@@ -252,23 +258,39 @@ const std::vector<std::string> kReplaced = {kAskPlatforms, consoleCommand("getdp
 const std::vector<std::string> kReplacedAfterRestart = {kAskPlatforms, consoleCommand("getdptype"), kStop, kStart,
                                                         consoleCommand("DELETE"), consoleCommand("IMPORT")};
 
-const DeploymentCase kSuccesses[] = {
-    succeeds("neither model nor scripts: nothing is done", {.model = ""}, {}, console("asfs"), {}),
-    succeeds("a model of a type that the agent starts with", {}, kReplaced, console(" asfs \n"),
-             {{"meta/m.mdl", "model\n"}, {"config/.ConfigData/kumenv", kStartup},
-              {"console", "getdptype ~/meta/m.mdl\nDELETE ~/meta/m.mdl\nIMPORT ~/meta/m.mdl\n"}}),
+const DeploymentCase kNothingToDo =
+    succeeds("neither model nor scripts: nothing is done", {.model = ""}, {}, console("asfs"), {});
+const DeploymentCase kServedType =
     succeeds("a type that another provider serves", {}, kReplaced, console("sock"),
-             {{"config/.ConfigData/kumenv", kStartup}}),
+             {{"config/.ConfigData/kumenv", kStartup}});
+const DeploymentCase kNewType =
     succeeds("a type that is new to the agent", {}, kReplacedAfterRestart, console("snmp"),
              {{"meta/m.mdl", "model\n"},
               {"config/.ConfigData/kumenv",
-               "ux|DATAPROVIDER|none|\n\ninst1|DATAPROVIDER|asfs,post,SNMP|\nlast\n"}}),
+               "ux|DATAPROVIDER|none|\n\ninst1|DATAPROVIDER|asfs,post,SNMP|\nlast\n"}});
+const DeploymentCase kScriptsAlone =
+    succeeds("scripts alone are only copied", {.model = "", .scripts = "s1.sh,s2.sh"}, {kAskPlatforms}, console("asfs"),
+             {{"work/scripts/s1.sh", "one\n"}, {"work/scripts/s2.sh", "two\n"}});
+const DeploymentCase kSurroundings =
+    succeeds("the console's surroundings", {.context = " port=1920,restart=y "}, kReplaced,
+             console("asfs", "env | grep -e ^KUM | sort > ~/surroundings"),
+             {{"surroundings", "KUMP_DPCONSOLE_NOCONFIRM=Y\nKUMP_DPCONSOLE_PORT=1920\nKUMP_RB_PATH=~/rb\n"
+                               "KUM_DP_HOSTNAME=node7\nKUM_PRODSPEC_PATH=~/meta/\n"}});
+
+const DeploymentCase kSuccesses[] = {
+    kNothingToDo,
+    succeeds("a model of a type that the agent starts with", {}, kReplaced, console(" asfs \n"),
+             {{"meta/m.mdl", "model\n"}, {"config/.ConfigData/kumenv", kStartup},
+              {"console", "getdptype ~/meta/m.mdl\nDELETE ~/meta/m.mdl\nIMPORT ~/meta/m.mdl\n"}}),
+    kServedType,
+    kNewType,
     succeeds("an agent that did not know the old model", {}, kReplaced,
              console("asfs", "case $command in DELETE*) exit 1 ;; esac"), {{"meta/m.mdl", "model\n"}}),
-    succeeds("scripts alone are only copied", {.model = "", .scripts = "s1.sh,s2.sh"}, {kAskPlatforms}, console("asfs"),
-             {{"work/scripts/s1.sh", "one\n"}, {"work/scripts/s2.sh", "two\n"}}),
-    succeeds("an instance in another case than its configuration file", {.target = "INST1:node7:DA"}, kReplaced,
-             console("asfs"), {{"meta/m.mdl", "model\n"}}),
+    kScriptsAlone,
+    succeeds("an instance in another case than its configuration file: its name there is the one used from then on",
+             {.target = "INST1:node7:DA"}, kReplacedAfterRestart, console("snmp"),
+             {{"config/.ConfigData/kumenv",
+               "ux|DATAPROVIDER|none|\n\ninst1|DATAPROVIDER|asfs,post,SNMP|\nlast\n"}}),
     succeeds("a product code in capitals", {.product = "UM"}, kReplaced, console("asfs"), {{"meta/m.mdl", "model\n"}}),
     succeeds("a list of nothing but commas is no list", {.model = "", .scripts = ",,"}, {kAskPlatforms},
              console("asfs"), {}),
@@ -278,10 +300,7 @@ const DeploymentCase kSuccesses[] = {
              {{"config/.ConfigData/kumenv", kStartup}}),
     succeeds("a context with a port that is not told", {.context = "RESTART=,PORT="}, kReplaced,
              console("asfs", "env | grep PORT > ~/surroundings"), {{"surroundings", "KUMP_DPCONSOLE_PORT=\n"}}),
-    succeeds("the console's surroundings", {.context = " port=1920,restart=y "}, kReplaced,
-             console("asfs", "env | grep -e ^KUM | sort > ~/surroundings"),
-             {{"surroundings", "KUMP_DPCONSOLE_NOCONFIRM=Y\nKUMP_DPCONSOLE_PORT=1920\nKUMP_RB_PATH=~/rb\n"
-                               "KUM_DP_HOSTNAME=node7\nKUM_PRODSPEC_PATH=~/meta/\n"}}),
+    kSurroundings,
 };
 
 DeploymentCase configured(DeploymentCase deployment, const std::string& configuration) {
@@ -294,6 +313,11 @@ DeploymentCase withFile(DeploymentCase deployment, const std::string& name, cons
   return deployment;
 }
 
+const DeploymentCase kNoProviderYet =
+    configured(succeeds("an agent that starts with no provider yet", {}, kReplacedAfterRestart, console("snmp"),
+                        {{"config/.ConfigData/kumenv", "ux|DATAPROVIDER|none|\n\ninst1|DATAPROVIDER|,SNMP|\nlast\n"}}),
+               "KUMP_META_PATH=~/meta\nKUM_WORK_PATH=~/work/um\nKUMP_RB_PATH=~/rb\n");
+
 const DeploymentCase kOddMachines[] = {
     configured(succeeds("a configuration file with lines of another system", {}, kReplaced, console("asfs"),
                         {{"meta/m.mdl", "model\n"}}),
@@ -302,9 +326,11 @@ const DeploymentCase kOddMachines[] = {
     configured(succeeds("a configuration file with a key twice: the later one counts", {}, kReplaced, console("asfs"),
                         {{"meta/m.mdl", "model\n"}}),
                "KUMP_META_PATH=/nowhere\n" + std::string(kConfiguration)),
-    configured(succeeds("an agent that starts with no provider yet", {}, kReplacedAfterRestart, console("snmp"),
-                        {{"config/.ConfigData/kumenv", "ux|DATAPROVIDER|none|\n\ninst1|DATAPROVIDER|,SNMP|\nlast\n"}}),
-               "KUMP_META_PATH=~/meta\nKUM_WORK_PATH=~/work/um\nKUMP_RB_PATH=~/rb\n"),
+    kNoProviderYet,
+    configured(succeeds("a type that a provider would serve, were it one of the agent's", {}, kReplacedAfterRestart,
+                        console("sock"), {{"config/.ConfigData/kumenv",
+                                           "ux|DATAPROVIDER|none|\n\ninst1|DATAPROVIDER|post,SOCK|\nlast\n"}}),
+               "KUMP_META_PATH=~/meta\nKUM_WORK_PATH=~/work/um\nKUMP_RB_PATH=~/rb\nKUMA_STARTUP_DP='post'\n"),
     configured(succeeds("a type that the one provider serves, where the agent starts without that", {},
                         kReplacedAfterRestart, console("file"),
                         {{"config/.ConfigData/kumenv",
@@ -338,7 +364,7 @@ INSTANTIATE_TEST_SUITE_P(Succeeding, DataAgentDeployment, testing::ValuesIn(kSuc
 INSTANTIATE_TEST_SUITE_P(OnOddMachines, DataAgentDeployment, testing::ValuesIn(kOddMachines));
 
 TEST_F(DataAgentDeployment, CopiedScriptsMayBeRunByOwnerAndGroup) {
-  run(kSuccesses[5]);
+  run(kScriptsAlone);
   for (const char* name : {"/work/scripts/s1.sh", "/work/scripts/s2.sh"}) {
     struct stat status = {};
     ASSERT_EQ(stat((home.path() + name).c_str(), &status), 0);
@@ -350,14 +376,14 @@ TEST_F(DataAgentDeployment, ListOfStartupProvidersKeepsItsMode) {
   home.file("config/.ConfigData/kumenv", "");
   const std::string list = home.path() + "/config/.ConfigData/kumenv";
   ASSERT_EQ(chmod(list.c_str(), 0640), 0);
-  run(kSuccesses[3]);
+  run(kNewType);
   struct stat status = {};
   ASSERT_EQ(stat(list.c_str(), &status), 0);
   EXPECT_EQ(status.st_mode & 07777, 0640u);
 }
 
 TEST_F(DataAgentDeployment, TracesEachStepOfANewType) {
-  run(kSuccesses[3]);
+  run(kNewType);
   for (const char* line :
        {"Context [] port (optional) [] restart (1=true) [0]",
         "DA Configuration file is \"~/config/um_inst1.config\", instance (optional) is \"inst1\"",
@@ -373,13 +399,25 @@ TEST_F(DataAgentDeployment, TracesEachStepOfANewType) {
   }
 }
 
+TEST_F(DataAgentDeployment, TracesTheOptionsOfTheContext) {
+  run(kSurroundings);
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "Context [PORT=1920,RESTART=Y] port (optional) [1920] restart (1=true) [1]"));
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "Environment variable 3 - KUMP_DPCONSOLE_PORT=1920"));
+  for (const char* context : {"RESTART=YES", "RESTART=", "RESTART=N"}) {
+    trace.clear();
+    run(succeeds(context, {.context = context}, kReplaced, console("asfs"), {}));
+    EXPECT_TRUE(
+        trace.has(RAS1_DETAIL, "Context [" + std::string(context) + "] port (optional) [] restart (1=true) [0]"));
+  }
+}
+
 TEST_F(DataAgentDeployment, TracesWhyNothingIsDone) {
-  run(kSuccesses[0]);
+  run(kNothingToDo);
   EXPECT_TRUE(trace.has(RAS1_DETAIL, "DA SetConfig called but no MDL or Script files specified"));
 }
 
 TEST_F(DataAgentDeployment, TracesWhyAServedTypeNeedsNoRestart) {
-  run(kSuccesses[2]);
+  run(kServedType);
   EXPECT_TRUE(trace.has(RAS1_DETAIL, "DPtype [SOCK] is part of dptype [ASFS]"));
   EXPECT_TRUE(trace.has(RAS1_DETAIL, "DPtype [ASFS] already in startup parms list [asfs,post]"));
 }
@@ -392,12 +430,12 @@ TEST_F(DataAgentDeployment, EachTypeThatTheOneProviderServesNeedsNoRestart) {
 }
 
 TEST_F(DataAgentDeployment, TracesTheModeOfACopiedScript) {
-  run(kSuccesses[5]);
+  run(kScriptsAlone);
   EXPECT_TRUE(trace.has(RAS1_DETAIL, atHome("Settings permissions on script file [~/work/scripts/s1.sh] to [504]")));
 }
 
 TEST_F(DataAgentDeployment, TracesThatTheAgentStartsWithNoProvider) {
-  run(kOddMachines[2]);
+  run(kNoProviderYet);
   EXPECT_TRUE(trace.has(RAS1_DETAIL, "No value found for KUMA_STARTUP_DP"));
 }
 
@@ -408,7 +446,7 @@ TEST_F(DataAgentDeployment, WorkDirectoryUnderTheRootHasItsScriptsThereToo) {
 }
 
 TEST_F(DataAgentDeployment, TracesThatTheListOfStartupProvidersIsEmpty) {
-  run(withFile(failures().back(), "config/.ConfigData/kumenv", ""));
+  run(fails(kEmptyStartup));
   EXPECT_TRUE(trace.has(RAS1_ERROR, atHome("Contents of config file [~/config/.ConfigData/kumenv] was empty")));
 }
 

@@ -49,6 +49,10 @@ class InventoryTable : public testing::Test {
       taken.push_back(item.row);
     }
   }
+  [[nodiscard]] std::string architectureProbe() const {
+    return "/bin/ksh -c '. " + home.path() + "/bin/dynarch.shl " + home.path() +
+           "/registry/archdsc.tbl >/dev/null 2>&1;echo ArchitectureHeader;echo $os;echo $cArch'";
+  }
   [[nodiscard]] std::string row(const Product& p) const {
     return column(kNode, 64) + column(home.path(), 512) + column(p.os, 5) + column(p.arch, 10) + column(p.product, 32) +
            column(p.version, 12) + column(p.description, 80) + column(p.release, 12) + column(p.platform, 20);
@@ -70,9 +74,7 @@ TEST_F(InventoryTable, ListsWhatIsInstalledAndWhatElseIsKnown) {
   inventory("-d", "Some text\n" + kHeader + line(kUnix));
   EXPECT_THAT(ask(), ElementsAre(row(kUnix), row(kLibraries)));
   EXPECT_THAT(commandLines(trace),
-              ElementsAre("/bin/ksh -c '. " + home.path() + "/bin/dynarch.shl " + home.path() +
-                              "/registry/archdsc.tbl >/dev/null 2>&1;echo ArchitectureHeader;echo $os;echo $cArch'",
-                          home.path() + "/bin/qinfo -d", home.path() + "/bin/qinfo -x"));
+              ElementsAre(architectureProbe(), home.path() + "/bin/qinfo -d", home.path() + "/bin/qinfo -x"));
   std::string product = line(kUnix);
   product.pop_back();
   for (const std::string& text :
@@ -89,7 +91,8 @@ TEST_F(InventoryTable, RunningProductsAreAskedForAlone) {
   EXPECT_THAT(ask({equal("PRODDESC", "  RUNNING now ")}), IsEmpty());  // the row holds the trimmed value
   EXPECT_THAT(ask({{"PRODDESC", INTF_EQ, "RUNNING now"}}), ElementsAre(row(asked)));
   EXPECT_TRUE(trace.has(RAS1_DETAIL, "Product Description is: RUNNING now"));
-  for (const std::string& command : commandLines(trace)) EXPECT_EQ(command.find("qinfo -d"), std::string::npos);
+  const std::string running = home.path() + "/bin/qinfo -r";
+  EXPECT_THAT(commandLines(trace), ElementsAre(architectureProbe(), running, architectureProbe(), running));
 }
 
 TEST_F(InventoryTable, AnyOtherDescriptionAsksForBothAndStandsInEachRow) {
@@ -98,6 +101,8 @@ TEST_F(InventoryTable, AnyOtherDescriptionAsksForBothAndStandsInEachRow) {
   Product asked = kUnix;
   asked.description = "mine";
   EXPECT_THAT(ask({equal("PRODDESC", "mine")}), ElementsAre(row(asked)));
+  EXPECT_THAT(commandLines(trace),
+              ElementsAre(architectureProbe(), home.path() + "/bin/qinfo -d", home.path() + "/bin/qinfo -x"));
 }
 
 TEST_F(InventoryTable, RepeatedLineIsReturnedOnceForEachRun) {
@@ -287,6 +292,8 @@ TEST_F(InventoryTable, RunningInAnyOtherCaseAsksForBoth) {
   Product asked = kUnix;
   asked.description = "running";
   EXPECT_THAT(ask({equal("PRODDESC", "running")}), ElementsAre(row(asked)));
+  EXPECT_THAT(commandLines(trace),
+              ElementsAre(architectureProbe(), home.path() + "/bin/qinfo -d", home.path() + "/bin/qinfo -x"));
 }
 
 TEST_F(InventoryTable, LongValuesAreCutAtTheirColumns) {

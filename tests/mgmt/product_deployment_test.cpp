@@ -4,6 +4,10 @@
 
 namespace {
 
+using testing::ElementsAre;
+using testing::IsEmpty;
+using testing::SizeIs;
+
 // ---- what the machine holds ----------------------------------------------------------------------------------------
 
 constexpr char kInventory[] = R"(case $1 in -d) cat <<'END'
@@ -62,6 +66,11 @@ const DeploymentCase kGetConfig[] = {
      .tools = translating("echo A=1"),
      .commands = afterLookup({"~/zlpqor6/lx8266/bin/vmq_xa -g  -pc ux"}),
      .answer = answerTo("GETCONFIG")},
+    {.situation = "without an instance the context stays as it was asked with",
+     .request = asked("GETCONFIG", {equal("PRODUCT", "ux"), equal("CONTEXT", "old")}),
+     .tools = translating("echo A=1"),
+     .commands = afterLookup({"~/zlpqor6/lx8266/bin/vmq_xa -g  -pc ux"}),
+     .answer = getAnswer(0, "", "", "old")},
     {.situation = "the first mark that is whole counts",
      .request = kGet,
      .tools = translating("printf 'INSTANCES=2\\ninstance=inst0\\nINSTANCE=inst1\\nINSTANCE=inst2\\n'"),
@@ -403,5 +412,14 @@ INSTANTIATE_TEST_SUITE_P(RemoveInstance, ProductDeployment, testing::ValuesIn(kR
 INSTANTIATE_TEST_SUITE_P(Uninstall, ProductDeployment, testing::ValuesIn(kUninstalls));
 INSTANTIATE_TEST_SUITE_P(Install, ProductDeployment, testing::ValuesIn(kInstalls));
 INSTANTIATE_TEST_SUITE_P(CompleteInstall, ProductDeployment, testing::ValuesIn(kCompletions));
+
+// The answer is a row like any other: the configuration that it brings must pass the query's predicates.
+TEST_F(ProductDeployment, ConfigurationReadBackIsHeldAgainstTheContextAskedWith) {
+  for (const auto& [name, body] : translating("echo INSTANCE=inst1")) home.tool(name, body);
+  EXPECT_THAT(ask(asked("GETCONFIG", {equal("PRODUCT", "ux"), equal("CONTEXT", "old")})), IsEmpty());
+  EXPECT_THAT(commandLines(trace), SizeIs(3)) << "the translator has run all the same";
+  EXPECT_THAT(ask(asked("GETCONFIG", {equal("PRODUCT", "ux"), {"CONTEXT", INTF_NE, "old"}})),
+              ElementsAre(getAnswer(0, "", "", "INSTANCE=inst1\n").bytes()));
+}
 
 }  // namespace

@@ -13,6 +13,7 @@
 
 #include "tests/rpc/transfer_fixture.h"
 #include "tests/support/failing_allocation.h"
+#include "tests/support/open_files.h"
 #include "tests/support/process_resources.h"
 #include "tests/support/scratch_file_system.h"
 #include "tests/support/system_faults.h"
@@ -306,15 +307,6 @@ TEST_F(BinaryDataTransferTest, BlockThatOnlyBeginsToFitIsTheOneThatFails) {
   EXPECT_EQ(readWholeFile(depot_ + "file"), a + b + c.substr(0, 8192 - 6000));
 }
 
-/// The descriptor under which this process has the file open; -1 for none.
-int descriptorOf(const std::string& path) {
-  for (const auto& entry : fs::directory_iterator("/proc/self/fd")) {
-    std::error_code ignored;  // the listing's own descriptor has gone
-    if (fs::read_symlink(entry, ignored) == path) return std::stoi(entry.path().filename());
-  }
-  return -1;
-}
-
 TEST_F(BinaryDataTransferTest, FailedWriteLeavesTheFileOpenButNotForPrograms) {
   if (!canMount()) GTEST_SKIP() << "needs a file system of its own";
   const ScratchFileSystem scratch(directory_ / "scratch", 4);
@@ -322,9 +314,9 @@ TEST_F(BinaryDataTransferTest, FailedWriteLeavesTheFileOpenButNotForPrograms) {
   for (const int chunk : {1, 2}) {
     const std::string name = "file" + std::to_string(chunk);
     EXPECT_EQ(transfer(name, chunk, {std::string(4096, 'x'), "y"}), 5u);
-    const int descriptor = descriptorOf(depot_ + name);
-    ASSERT_GE(descriptor, 0);
-    EXPECT_EQ(fcntl(descriptor, F_GETFD), FD_CLOEXEC);
+    const std::vector<int> descriptors = descriptorsOf(depot_ + name);
+    ASSERT_EQ(descriptors.size(), 1u);
+    EXPECT_TRUE(isClosedOnExec(descriptors[0]));
   }
 }
 

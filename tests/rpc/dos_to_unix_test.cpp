@@ -1,8 +1,10 @@
 #include "rpc/dos_to_unix.h"
 
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <cerrno>
 #include <csignal>
@@ -10,6 +12,8 @@
 #include <thread>
 
 #include "tests/rpc/transfer_fixture.h"
+#include "tests/support/eventually.h"
+#include "tests/support/open_files.h"
 #include "tests/support/process_resources.h"
 #include "tests/support/scratch_file_system.h"
 #include "tests/support/system_faults.h"
@@ -100,6 +104,21 @@ TEST_F(ConvertDos2UnixTest, LeavesNoDescriptor) {
   fs::remove_all(home_ + "/tmp");
   (void)convertDOS2Unix(path.c_str());
   EXPECT_EQ(ProcessResources::now().descriptors, before);
+}
+
+TEST_F(ConvertDos2UnixTest, KeepsItsFilesFromPrograms) {
+  const std::string path = directory_ / "depot/pipe";
+  ASSERT_EQ(mkfifo(path.c_str(), 0600), 0);
+  std::thread converting([&] { EXPECT_EQ(convertDOS2Unix(path.c_str()), 0); });
+  const int source = open(path.c_str(), O_WRONLY | O_CLOEXEC);  // once the other end is open
+  EXPECT_TRUE(eventually([&] { return descriptorsOf(work_file_).size() == 1; }));
+  EXPECT_EQ(descriptorsOf(path).size(), 2u);
+  for (const std::string& name : {path, work_file_})
+    for (const int descriptor : descriptorsOf(name)) EXPECT_TRUE(isClosedOnExec(descriptor)) << name;
+  EXPECT_EQ(write(source, "line\r\n", 6), 6);
+  close(source);
+  converting.join();
+  EXPECT_EQ(readWholeFile(path), "line\n");
 }
 
 // ---- the work file -------------------------------------------------------------------------------------------------

@@ -1,12 +1,19 @@
 #include "tasks/file_helpers.h"
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
+#include <cerrno>
 #include <clocale>
 #include <string>
+#include <thread>
+#include <vector>
 
 #include "test_seam.h"
+#include "tests/support/open_files.h"
+#include "tests/support/system_faults.h"
 #include "tests/support/temporary_directory.h"
 
 namespace {
@@ -100,6 +107,47 @@ TEST_F(TaskFiles, FullDeviceFailsTheWriting) {
 TEST_F(TaskFiles, FullDeviceFailsTheClosing) {
   EXPECT_FALSE(writeFile("/dev/full", "x"));
   EXPECT_TRUE(trace.has(RAS1_ERROR, "Failed to close stream for file /dev/full"));
+}
+
+TEST_F(TaskFiles, FailedCloseAfterReadingIsOnlyTraced) {
+  const std::string file = directory.writeFile("f", "text");
+  const SystemFault failing(SystemCall::kFclose, EIO);
+  EXPECT_EQ(readFile(text(file)).toNarrow(), "text");
+  EXPECT_EQ(trace.texts(RAS1_ERROR), std::vector{"Failed to close stream for file " + file});
+}
+
+// A pipe holds each of them up while it is open.
+
+TEST_F(TaskFiles, ProgramsDoNotGetAFileThatIsRead) {
+  const std::string file = directory / "pipe";
+  ASSERT_EQ(mkfifo(file.c_str(), 0600), 0);
+  std::thread reading([&] { EXPECT_EQ(readFile(text(file)).toNarrow(), "text"); });
+  const int other_end = open(file.c_str(), O_WRONLY | O_CLOEXEC);  // once the reader's is open
+  const std::vector<int> ends = descriptorsOf(file);
+  EXPECT_EQ(ends.size(), 2u);
+  for (const int end : ends) EXPECT_TRUE(isClosedOnExec(end));
+  EXPECT_EQ(write(other_end, "text", 4), 4);
+  close(other_end);
+  reading.join();
+}
+
+TEST_F(TaskFiles, ProgramsDoNotGetAFileThatIsWritten) {
+  const std::string file = directory / "pipe";
+  ASSERT_EQ(mkfifo(file.c_str(), 0600), 0);
+  const std::string long_text(1 << 20, 'x');  // more than a pipe holds
+  std::thread writing([&] { EXPECT_TRUE(writeFile(text(file), text(long_text))); });
+  const int other_end = open(file.c_str(), O_RDONLY | O_CLOEXEC);
+  char first = 0;
+  EXPECT_EQ(read(other_end, &first, 1), 1);
+  const std::vector<int> ends = descriptorsOf(file);
+  EXPECT_EQ(ends.size(), 2u);
+  for (const int end : ends) EXPECT_TRUE(isClosedOnExec(end));
+  std::vector<char> rest(long_text.size());
+  ssize_t count = 0;
+  for (size_t taken = 1; taken < long_text.size() && (count = read(other_end, rest.data(), rest.size())) > 0;)
+    taken += static_cast<size_t>(count);
+  close(other_end);
+  writing.join();
 }
 
 TEST_F(TaskFiles, DeletesAFile) {

@@ -5,9 +5,9 @@
 
 #include <string>
 
-#include "bss1.h"
 #include "tasks/task_manager.h"
 #include "test_seam.h"
+#include "tests/support/scoped_variable.h"
 #include "tests/tasks/installation_home.h"
 
 namespace {
@@ -18,15 +18,13 @@ using VMQ::String;
 class Removals : public testing::Test {
  protected:
   Removals() { depotDir = String(home.depot().c_str()); }
-  ~Removals() override {
-    depotDir = String();
-    unsetenv("QOR_BINARCH");
-  }
+  ~Removals() override { depotDir = String(); }
 
   std::string replaced(const char* text, const char* product = "ux", const char* version = "06.20.00") {
     return replaceTokens(text, product, version).toNarrow();
   }
 
+  const ScopedVariable architecture{"QOR_BINARCH", std::nullopt};
   InstallationHome home;
   TaskQueueElem request;
   TEST_TraceCapture trace;
@@ -70,7 +68,7 @@ END)");
   home.tool("bin/uninstall.sh", "exit 0");
   request.product = "ux";
   EXPECT_EQ(uninstall(request), TASK_OK);
-  BSS1_PutEnv("QOR_BINARCH=li6266");
+  architecture.put("li6266");
   EXPECT_EQ(uninstall(request), TASK_OK);
   EXPECT_THAT(commandLines(trace),
               ElementsAre(home.path() + "/bin/qinfo -d ", home.path() + "/bin/qinfo -d ",

@@ -14,6 +14,7 @@
 #include <vector>
 
 #include "tests/apps/vmqd/test_daemon.h"
+#include "tests/support/eventually.h"
 
 namespace {
 
@@ -217,8 +218,11 @@ TEST(Stop, TakesNoMoreRequestsOnOpenConnections) {
   gate.waitForQuery();
   daemon.process().signal(SIGTERM);
   EXPECT_EQ("STOPPING=1", daemon.process().nextNotification());
-  HttpReply reply = other.get("/v1/health");
-  while (reply.status == 200) reply = other.get("/v1/health");  // told a moment before it is done
+  HttpReply reply;
+  EXPECT_TRUE(eventually([&] {  // it is told a moment before it is done
+    reply = other.get("/v1/health");
+    return reply.status != 200;
+  }));
   EXPECT_EQ(503, reply.status);
   EXPECT_EQ("busy", errorCode(reply));
   gate.open();
@@ -241,7 +245,7 @@ TEST(Stop, TakesNoMoreClients) {
       return error.code().value() == ECONNREFUSED;
     }
   };
-  while (!refused()) std::this_thread::yield();  // ctest's time-out ends it
+  EXPECT_TRUE(eventually(refused));
   gate.open();
   asking.join();
   EXPECT_EQ(0, daemon.process().wait());

@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "tests/apps/vmqd/test_daemon.h"
+#include "tests/support/eventually.h"
 
 namespace {
 
@@ -124,7 +125,7 @@ TEST_F(WatchersTest, AreForgottenWhenTheyLeave) {
     const auto watcher = watch();
     EXPECT_EQ(1, daemon.get("/v1/health")["watchers"]);
   }
-  while (daemon.get("/v1/health")["watchers"] != 0) std::this_thread::yield();  // ctest's time-out ends it
+  EXPECT_TRUE(eventually([&] { return daemon.get("/v1/health")["watchers"] == 0; }));
 }
 
 TEST_F(WatchersTest, MayEndTheirSending) {
@@ -171,7 +172,7 @@ TEST(ConnectionLimit, IsToldToThoseBeyondIt) {
   EXPECT_TRUE(fifth.hungUp());
   clients.clear();
   const auto served = [&] { return HttpClient(daemon.socket()).get("/v1/health").status == 200; };
-  while (!served()) std::this_thread::yield();  // ctest's time-out ends it
+  EXPECT_TRUE(eventually(served));
 }
 
 TEST(ManyClients, AreServedAtATime) {
