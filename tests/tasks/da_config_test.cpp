@@ -37,6 +37,17 @@ TEST(DataAgentScripts, WhoseModeCannotBeSetAreTracedAndTheNextIsCopied) {
             std::vector{"Failed to set permissions on file [" + scripts + "s1.sh] to [504]"});  // 0770
   EXPECT_EQ(readWholeFile(scripts + "s1.sh"), "depot/s1.sh");
   EXPECT_EQ(readWholeFile(scripts + "s2.sh"), "depot/s2.sh");
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "Return code is 0"));
+}
+
+TEST(DataAgentConfiguration, TracesTheCodeOfAFailure) {
+  const InstallationHome home;
+  TaskQueueElem request;
+  request.product = "um";
+  request.daconfig = "m.mdl";
+  const TEST_TraceCapture trace;
+  EXPECT_EQ(setDaconfig(request), TASK_NO_AGENT_CONFIG);
+  EXPECT_TRUE(trace.has(RAS1_DETAIL, "Return code is 1020"));
 }
 
 }  // namespace
