@@ -62,11 +62,21 @@ bool writeBeside(const std::string& path, const std::string& contents, const str
   return true;
 }
 
+/// Opens it for writing, creating it when it is missing.
+int openTarget(const std::string& path, bool& isNew) {
+  constexpr int flags = O_WRONLY | O_CREAT | O_CLOEXEC;
+  constexpr mode_t mode = 0666;
+  const int created = open(path.c_str(), flags | O_EXCL, mode);
+  isNew = created >= 0;
+  return isNew || errno != EEXIST ? created : open(path.c_str(), flags, mode);
+}
+
 }  // namespace
 
 bool replaceFile(const std::string& path, const std::string& contents, int& error) {
   const Trace trace(traceUnit);
-  const int target = open(path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0666);
+  bool isNew = false;
+  const int target = openTarget(path, isNew);
   if (target < 0) {
     error = errno;
     return false;
@@ -74,15 +84,15 @@ bool replaceFile(const std::string& path, const std::string& contents, int& erro
   struct stat status;
   error = errorOf(fstat(target, &status));
   bool opened = true;
-  if (error == 0) {
-    if (S_ISREG(status.st_mode)) {
-      opened = writeBeside(path, contents, status, error);
-    } else {
-      error = writeAll(target, contents);
-    }
+  const bool isPlain = error == 0 && S_ISREG(status.st_mode);
+  if (isPlain) {
+    opened = writeBeside(path, contents, status, error);
+  } else if (error == 0) {
+    error = writeAll(target, contents);
   }
   const int closed = errorOf(close(target));
-  if (error == 0) error = closed;
+  if (error == 0 && !isPlain) error = closed;  // nothing was written to a plain file
+  if (error != 0 && isNew) (void)unlink(path.c_str());  // the first error counts
   return opened;
 }
 

@@ -4,7 +4,7 @@
 
 #include "rpc.h"
 
-const FailingFunction kAllocation{"allocation", SystemCall::kAllocate, ENOMEM, FailingFunction::kLosesRows};
+const FailingFunction kAllocation{"allocation", SystemCall::kAllocate, ENOMEM, FailingFunction::kThrows};
 
 const std::vector<FailingFunction>& failingFunctions() {
   static const auto& kFunctions = *new std::vector<FailingFunction>{
@@ -24,6 +24,7 @@ const std::vector<FailingFunction>& failingFunctions() {
       {"poll", SystemCall::kPoll, ENOMEM},
       {"read", SystemCall::kRead, EIO, FailingFunction::kIsTraced},
       {"write", SystemCall::kWrite, EIO, FailingFunction::kIsTraced},
+      {"writev", SystemCall::kWritev, EIO},
       {"fcntl", SystemCall::kFcntl, EBADF, FailingFunction::kIsTraced},
       {"BSS1_TimedWait", SystemCall::kTimedWait, EINVAL},
       // ---- files and directories
@@ -46,16 +47,17 @@ const std::vector<FailingFunction>& failingFunctions() {
       {"strdup", SystemCall::kStrdup, ENOMEM},
       // ---- the host
       {"BSS1_GetEnv", {}},
-      {"BSS1_GetLock", {}, EDEADLK, FailingFunction::kLosesRows},
+      {"BSS1_GetLock", {}, EDEADLK, FailingFunction::kLosesEvent},
       {"BSS1_ReleaseLock", {}, EPERM},
-      {"NLS2_GetLocale", {}, ENOENT},
+      {"FSI1_NewList", {}, EIO},
+      {"FSI1_FetchList", {}, EIO},
+      {"FSI1_DeleteList", {}, EIO},
       {"XML1_ParserCreate", {}},
       {"XML1_GetBuffer", {}},
       {"XML1_ParseBuffer", {}, 1},
-      {"InsertRow", {}, ENOMEM, FailingFunction::kLosesRows},
-      {"Dispatch", {}, EIO, FailingFunction::kLosesRows},
+      {"InsertRow", {}, ENOMEM, FailingFunction::kLosesRow},
+      {"Dispatch", {}, EIO, FailingFunction::kLosesRow},
       {"rpc__malloc", {}},
-      {"rpc__alloc_pkt", {}},
   };
   return kFunctions;
 }

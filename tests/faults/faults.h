@@ -20,8 +20,9 @@ struct FailingFunction {
     /// The trace tells that a program could not be executed, its input not be written or its output not be read, but
     /// the result is that of the program. On purpose.
     kIsTraced,
-    /// What is delivered through it is lost, which is the host's to know.
-    kLosesRows
+    kLosesEvent,  ///< an event is not delivered, and the trace tells
+    kLosesRow,    ///< the answer or an event is not delivered, which is the host's to know
+    kThrows       ///< an exception, which may end the answering or the delivery of an event; the trace tells
   } effect = kFails;
 };
 

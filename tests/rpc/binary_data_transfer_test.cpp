@@ -290,7 +290,7 @@ TEST_F(BinaryDataTransferTest, FullFileSystemIsAFailureThatKeepsWhatWasWritten) 
 
 TEST_F(BinaryDataTransferTest, PartThatTheSystemDidNotTakeIsWrittenAfterIt) {
   for (const int chunk : {1, 2}) {
-    const SystemFault writesHalf(SystemCall::kWritev, EIO);
+    const SystemFault writesHalf(SystemCall::kWritevShort, EIO);
     EXPECT_EQ(transfer("file", chunk, {"abcdef", "", "gh", "i"}), 0u);
     EXPECT_TRUE(writesHalf.happened());
   }
@@ -317,6 +317,37 @@ TEST_F(BinaryDataTransferTest, FailedWriteLeavesTheFileOpenButNotForPrograms) {
     const std::vector<int> descriptors = descriptorsOf(depot_ + name);
     ASSERT_EQ(descriptors.size(), 1u);
     EXPECT_TRUE(isClosedOnExec(descriptors[0]));
+  }
+}
+
+TEST_F(BinaryDataTransferTest, BlocksThatCannotBeWrittenTogetherAreWrittenOneByOne) {
+  for (const int chunk : {1, 2}) {
+    const SystemFault failing(SystemCall::kWritev, EIO);
+    EXPECT_EQ(transfer("file", chunk, {"one", "", "two"}), 0u);
+    EXPECT_TRUE(failing.happened());
+  }
+  EXPECT_EQ(readWholeFile(depot_ + "file"), "onetwoonetwo");
+  EXPECT_THAT(trace_.texts(RAS1_ERROR), IsEmpty());
+}
+
+TEST_F(BinaryDataTransferTest, BlockThatCannotBeWrittenFailsAndLeavesTheFileOpenButNotForPrograms) {
+  for (const int chunk : {1, 2}) {
+    SCOPED_TRACE(chunk);
+    trace_.clear();
+    const std::string name = "file" + std::to_string(chunk);
+    {
+      const SystemFault together(SystemCall::kWritev, ENOSPC);
+      const SystemFault alone(SystemCall::kFwrite, ENOSPC);
+      EXPECT_EQ(transfer(name, chunk, {"one", "two"}), 5u);
+      EXPECT_TRUE(together.happened());
+    }
+    EXPECT_THAT(trace_.texts(RAS1_ERROR), ElementsAre("Error writing chunk 0, error number was 1"));
+    EXPECT_EQ(readWholeFile(depot_ + name), "");
+    const int descriptor = descriptorOf(depot_ + name);
+    ASSERT_GE(descriptor, 0);
+    EXPECT_EQ(fcntl(descriptor, F_GETFD), FD_CLOEXEC);
+    EXPECT_EQ(transfer(name, chunk, {"one", "two"}), 0u) << "the next try";
+    EXPECT_EQ(readWholeFile(depot_ + name), "onetwo");
   }
 }
 

@@ -5,6 +5,7 @@
 #include <pthread.h>
 #include <sched.h>
 #include <signal.h>
+#include <stdio_ext.h>
 #include <sys/eventfd.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
@@ -71,21 +72,24 @@ Result failAfterwards(SystemCall call, Result failure, Result result) {
 template <typename Real>
 auto onBrokenStream(FILE* stream, const char* elsewhere, int flags, Real real) {
   const int descriptor = fileno(stream);
+  const int closed_on_exec = (fcntl(descriptor, F_GETFD) & FD_CLOEXEC) != 0 ? O_CLOEXEC : 0;
   const int kept = dup(descriptor);
   const int broken = open(elsewhere, flags | O_CLOEXEC);
   (void)dup2(broken, descriptor);
   const auto result = real();
   const int error = errno;
-  (void)dup2(kept, descriptor);
+  (void)dup3(kept, descriptor, closed_on_exec);
   for (const int extra : {kept, broken}) (void)close(extra);
   errno = error;
   return result;
 }
 
-/// Reading, which finds a directory.
+/// Reading, which finds a directory. A small file has been read ahead by whoever looked for its end.
 template <typename Real>
 auto orUnreadable(FILE* stream, Real real) {
-  return strike(SystemCall::kFread) == 0 ? real() : onBrokenStream(stream, "/", O_RDONLY | O_DIRECTORY, real);
+  if (strike(SystemCall::kFread) == 0) return real();
+  __fpurge(stream);
+  return onBrokenStream(stream, "/", O_RDONLY | O_DIRECTORY, real);
 }
 
 /// Writing, which finds a full device.
@@ -244,8 +248,8 @@ WRAP(ssize_t, write, int descriptor, const void* buffer, size_t length) {
 }
 
 WRAP(ssize_t, writev, int descriptor, const iovec* pieces, int count) {
-  if (strike(SystemCall::kWritev) == 0) return __real_writev(descriptor, pieces, count);
-  return __real_write(descriptor, pieces->iov_base, pieces->iov_len / 2);
+  if (strike(SystemCall::kWritevShort) != 0) return __real_write(descriptor, pieces->iov_base, pieces->iov_len / 2);
+  return orErrno(SystemCall::kWritev, ssize_t{-1}, [&] { return __real_writev(descriptor, pieces, count); });
 }
 
 WRAP(int, fcntl, int descriptor, int command, ...) {
@@ -295,20 +299,28 @@ WRAP(int, fchown, int descriptor, uid_t owner, gid_t group) {
   return orErrno(SystemCall::kFchown, -1, [&] { return __real_fchown(descriptor, owner, group); });
 }
 
-WRAP(int, fsync, int descriptor) {
-  return orErrno(SystemCall::kFsync, -1, [&] { return __real_fsync(descriptor); });
-}
-
-WRAP(int, rename, const char* from, const char* to) {
-  return orErrno(SystemCall::kRename, -1, [&] { return __real_rename(from, to); });
-}
-
 WRAP(int, unlink, const char* path) {
   return orErrno(SystemCall::kUnlink, -1, [&] { return __real_unlink(path); });
 }
 
 WRAP(int, link, const char* from, const char* to) {
   return orErrno(SystemCall::kLink, -1, [&] { return __real_link(from, to); });
+}
+
+WRAP(int, rename, const char* from, const char* to) {
+  return orErrno(SystemCall::kRename, -1, [&] { return __real_rename(from, to); });
+}
+
+WRAP(char*, realpath, const char* path, char* resolved) {
+  return orErrno(SystemCall::kRealpath, static_cast<char*>(nullptr), [&] { return __real_realpath(path, resolved); });
+}
+
+WRAP(int, mkostemp, char* path, int flags) {
+  return orErrno(SystemCall::kMkostemp, -1, [&] { return __real_mkostemp(path, flags); });
+}
+
+WRAP(int, fsync, int descriptor) {
+  return orErrno(SystemCall::kFsync, -1, [&] { return __real_fsync(descriptor); });
 }
 
 WRAP(int, uname, utsname* names) {

@@ -24,7 +24,8 @@ enum class SystemCall {
   kPoll,
   kRead,
   kWrite,
-  kWritev,  ///< it does not fail, but writes only half of its first piece, as the system may
+  kWritev,
+  kWritevShort,  ///< it does not fail, but writes only half of its first piece, as the system may
   kFcntl,
   kTimedWait,  ///< BSS1_TimedWait
   kDup3,       ///< these three between clone and exec
@@ -37,10 +38,12 @@ enum class SystemCall {
   kChmod,
   kFchmod,
   kFchown,
-  kFsync,
-  kRename,
   kUnlink,
   kLink,
+  kRename,
+  kRealpath,
+  kMkostemp,
+  kFsync,
   kUname,
   kOpen,
   kClose,  ///< it is closed all the same; so is a stream
@@ -48,7 +51,7 @@ enum class SystemCall {
   kFdopen,
   kFseek,
   kFtell,
-  kFread,   ///< reading a character too. The error is EISDIR
+  kFread,   ///< reading a character too; what the stream has read ahead is gone. The error is EISDIR
   kFwrite,  ///< writing a character and flushing too. The error is ENOSPC
   kFclose,
   kAllocate,  ///< operator new throws; malloc, calloc and realloc give a null pointer
