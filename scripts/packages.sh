@@ -7,6 +7,7 @@ packages_run='curl ksh'
 packages_tests='libgtest-dev libgmock-dev libbenchmark-dev libyaml-cpp-dev'
 packages_fuzz='clang libclang-rt-14-dev'
 packages_coverage='gcovr'
+packages_analysis='clang-tidy cppcheck shellcheck'
 
 as_root() {
   if [ "$(id -u)" -eq 0 ]; then "$@"; else sudo "$@"; fi
