@@ -18,6 +18,7 @@
 #include <functional>
 #include <stdexcept>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "apps/vmqctl/failure.h"
@@ -106,7 +107,7 @@ double peakKilobytesOf(const std::vector<std::string>& arguments) {
   double peak = 0;
   while (waitpid(pid, nullptr, WNOHANG) == 0) {
     peak = std::max(peak, peakKilobytes(pid));
-    usleep(1000);
+    std::this_thread::sleep_for(std::chrono::milliseconds(1));
   }
   return peak;
 }

@@ -22,7 +22,7 @@ using Results = std::map<std::string, Json>;
 /// The name without the parts that only say how it was run.
 std::string plainName(std::string name) {
   for (const char* part : {"/iterations:", "/min_time:", "/repeats:", "/real_time", "/manual_time", "/process_time"}) {
-    name = name.substr(0, name.find(part));
+    if (const size_t at = name.find(part); at != std::string::npos) name.resize(at);
   }
   return name;
 }

@@ -1,6 +1,7 @@
 // Requests to the daemon behind its HTTP library: a method, a path, the arguments of a query string, a body. The depot
 // holds one file, and nothing outside of it may be reached.
 
+#include <cstring>
 #include <nlohmann/json.hpp>
 #include <string>
 
@@ -46,7 +47,7 @@ int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   const std::string method = methods[input.below(std::size(methods))];
   std::string path = paths[input.below(std::size(paths))];
   path += input.text(256);
-  path = path.c_str();  // the library hands over a text that a zero byte ends
+  path.resize(std::strlen(path.c_str()));  // the library hands over a text that a zero byte ends
   vmqd::Request request{method, path, {}, {}, {}, {}, -1};
   for (unsigned count = input.below(4); count > 0; --count) {
     const std::string_view name = input.text(64);

@@ -71,6 +71,7 @@ int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   const vmqhost::RpcCall call{(options & known) != 0 ? QOR_Agent_v1_if_spec.id : named.value_or(rpc__uuid{}),
                               (options & knownVersion) != 0 ? 1u : number,
                               (options & knownOperation) != 0 ? 0u : number, labelled.value_or(otherwise), packet};
+  // cppcheck-suppress danglingLifetime ; not used after the call below
   fuzz::transfer = {packet, call.sender, number, (options & managerFails) != 0 ? 0x1c00beef : 0u};
 
   const vmqhost::RpcResult result = vmqhost::call(call);

@@ -90,7 +90,7 @@ class Twins {
       }
       case 9:
         text_.assign(text_, count);
-        model_ = model_.substr(0, count);
+        model_.resize(std::min<size_t>(count, model_.size()));
         break;
       case 10:
         text_ = textOf(other);

@@ -27,6 +27,7 @@ class vmq_kagdyst_base : public VMQ::TableRequest<vmq_kagdyst_description> {
   using TableRequest::TableRequest;
 };
 
+// NOLINTNEXTLINE(cppcoreguidelines-special-member-functions): its base cannot be copied
 class vmq_kagdyst_agent : public vmq_kagdyst_base {
  public:
   using vmq_kagdyst_base::vmq_kagdyst_base;

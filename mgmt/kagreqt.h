@@ -31,6 +31,7 @@ class vmq_kagreqt_base : public VMQ::TableRequest<vmq_kagreqt_description> {
   using TableRequest::TableRequest;
 };
 
+// NOLINTNEXTLINE(cppcoreguidelines-special-member-functions): its base cannot be copied
 class vmq_kagreqt_agent : public vmq_kagreqt_base {
  public:
   using vmq_kagreqt_base::vmq_kagreqt_base;

@@ -28,6 +28,7 @@ class vmq_kinagt_base : public VMQ::TableRequest<vmq_kinagt_description> {
   using TableRequest::TableRequest;
 };
 
+// NOLINTNEXTLINE(cppcoreguidelines-special-member-functions): its base cannot be copied
 class vmq_kinagt_agent : public vmq_kinagt_base {
  public:
   using vmq_kinagt_base::vmq_kinagt_base;

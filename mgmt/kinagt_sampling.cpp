@@ -37,7 +37,8 @@ Architecture probeArchitecture(const Trace& trace) {
                          ";echo $os;echo $cArch" + "'";
   Architecture architecture;
   int exitCode = 0;
-  String out, err;
+  String out;
+  String err;
   if (!Util::runCommand(command, exitCode, out, err, "", /*nonBlocking=*/false) || exitCode != 0) return architecture;
   const unsigned header = out.find(String(ARCHITECTURE_HEADER), 0);
   if (header == String::NPOS) {
@@ -68,7 +69,8 @@ void runQinfo(const Trace& trace, const char* option, const String& prodDesc, co
   const String command = inventoryCommand(option);
   TRACE_DETAIL(trace, "qinfo command is: [%s]", command.c_str().get());
   int exitCode = 0;
-  String out, err;
+  String out;
+  String err;
   if (!Util::runCommand(command, exitCode, out, err, "", /*nonBlocking=*/false) || exitCode != 0) return;
 
   StrStrMap seen;  // a list would make ten thousand products cost fifty million comparisons

@@ -11,6 +11,7 @@ namespace VMQ {
 
 /// One child. Kept alive by both the Process and the waiter thread, whichever ends last.
 struct ProcessData {
+  // cppcheck-suppress uninitMemberVar ; initialize() makes mutex and condition
   ProcessData() = default;
   ~ProcessData();
   ProcessData(const ProcessData&) = delete;

@@ -123,6 +123,7 @@ bool putInPlace(const Trace& trace, const String& work, const String& path) {
 
 }  // namespace
 
+// NOLINTNEXTLINE(performance-unnecessary-value-param): the interface passes it by value
 int32_t convertDOS2Unix(String path) {
   const Trace trace(traceUnit);
   const std::lock_guard guard(oneAtATime);

@@ -10,7 +10,7 @@ namespace {
 RAS1_Unit traceUnit{"util/agent_entry"};
 
 InstanceEntry* instanceOf(long slot) {
-  return reinterpret_cast<InstanceEntry*>(slot);
+  return reinterpret_cast<InstanceEntry*>(slot);  // NOLINT(performance-no-int-to-ptr): a slot is a long
 }
 long slotOf(InstanceEntry* instance) {
   return reinterpret_cast<long>(instance);

@@ -90,7 +90,7 @@ class ArrayBlock {
     const uintptr_t start = reinterpret_cast<uintptr_t>(memory);
     const uintptr_t first = start / PAGE * PAGE;
     const uintptr_t end = (start + malloc_usable_size(memory) + PAGE - 1) / PAGE * PAGE;
-    (void)madvise(reinterpret_cast<void*>(first), end - first, MADV_HUGEPAGE);  // a wish
+    (void)madvise(reinterpret_cast<void*>(first), end - first, MADV_HUGEPAGE);  // NOLINT(*-int-to-ptr): a mere wish
     return memory;
   }
   static void* checked(void* memory) {

@@ -26,7 +26,7 @@ class CharStar {
   // NOLINTBEGIN(google-explicit-constructor): converting silently is what it is for
   operator const char*() const { return text_; }
   operator char*() const { return text_; }
-  // NOLINTEND
+  // NOLINTEND(google-explicit-constructor)
   /// For calls with "...", where nothing converts.
   [[nodiscard]] const char* get() const { return text_; }
 

@@ -126,10 +126,10 @@ void DOMParser::recordError() {
   const char* const text = XML1_ErrorString(code);
   char message[messageBytes];
   if (text != nullptr) {
-    std::snprintf(message, sizeof message, "%d:%d: %s\n", static_cast<int>(XML1_GetCurrentLineNumber(parser_)),
-                  static_cast<int>(XML1_GetCurrentColumnNumber(parser_)), text);
+    (void)std::snprintf(message, sizeof message, "%d:%d: %s\n", static_cast<int>(XML1_GetCurrentLineNumber(parser_)),
+                        static_cast<int>(XML1_GetCurrentColumnNumber(parser_)), text);
   } else {
-    std::snprintf(message, sizeof message, "Unknown error code: %d", code);
+    (void)std::snprintf(message, sizeof message, "Unknown error code: %d", code);
   }
   setErrorMessage(message);
 }

@@ -149,6 +149,7 @@ int copyOneFile(const Trace& trace, const String& source, const String& destinat
   }
   int rc = copyStream(trace, from.get(), to.get(), source, destination);
   for (const int closed :
+       // cppcheck-suppress accessMoved ; takes the list for the body of the loop
        {closeStream(trace, std::move(from), source), closeStream(trace, std::move(to), destination)}) {
     if (rc == 0) rc = closed;
   }

@@ -11,7 +11,7 @@ namespace VMQ {
 class ResourceBundleException {
  public:
   explicit ResourceBundleException(const String& message) : message_(message) {}
-  ResourceBundleException(const ResourceBundleException& other) : message_(other.message_) {}
+  ResourceBundleException(const ResourceBundleException& other) = default;
   ResourceBundleException& operator=(const ResourceBundleException&) = delete;
   virtual ~ResourceBundleException() = default;
 

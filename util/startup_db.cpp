@@ -17,7 +17,7 @@ namespace {
 RAS1_Unit traceUnit{"util/startup_db"};
 
 AgentEntry* agentOf(long slot) {
-  return reinterpret_cast<AgentEntry*>(slot);
+  return reinterpret_cast<AgentEntry*>(slot);  // NOLINT(performance-no-int-to-ptr): a slot is a long
 }
 long slotOf(AgentEntry* agent) {
   return reinterpret_cast<long>(agent);

@@ -39,7 +39,7 @@ class StartupDB {
   /// cannot be read back ("<", "&" or a carriage return, or anything else the parser rejects, such as bytes that are
   /// not UTF-8). The file is replaced in one step and keeps its mode and owner: what goes wrong once it is open (a full
   /// disk) is traced, leaves the earlier contents whole, and, kept on purpose, still returns true.
-  bool save() const;
+  [[nodiscard]] bool save() const;
 
   /// Takes ownership. Product codes may repeat; lookups find the first.
   void addAgent(AgentEntry* agent);

@@ -155,7 +155,7 @@ unsigned short* String::copyUnicodeString(const unsigned short* s) {
   return copy;
 }
 
-void String::releaseUnicodeString(unsigned short* s) {
+void String::releaseUnicodeString(unsigned short* s) {  // NOLINT(readability-non-const-parameter): it ends here
   delete[] s;
 }
 

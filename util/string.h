@@ -43,12 +43,12 @@ class String {
   /// Up to the 0 unit.
   String(const unsigned short* s) : String() { assign(s); }
   String(std::nullptr_t) noexcept : String() {}
-  // NOLINTEND
+  // NOLINTEND(google-explicit-constructor)
   virtual ~String() = default;
 
-  String& operator=(const String& s) { return assign(s); }
+  String& operator=(const String& s) { return assign(s); }  // NOLINT(misc-unconventional-assign-operator): assign does
   String& operator=(String&& s) noexcept;
-  String& operator=(const unsigned short* s) { return assign(s); }
+  String& operator=(const unsigned short* s) { return assign(s); }  // NOLINT(misc-unconventional-assign-operator)
   String& assign(const String& s);
   String& assign(const String& s, unsigned int n);  ///< at most the length of `s`
   String& assign(const unsigned short* s);

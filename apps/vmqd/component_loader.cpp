@@ -34,10 +34,13 @@ void loadComponent(const std::string& library) {
   void* const handle = dlopen(library.c_str(), RTLD_NOW | RTLD_LOCAL);
   if (handle == nullptr) throw std::runtime_error(std::string("the component does not load: ") + dlerror());
   const auto initialize = reinterpret_cast<unsigned (*)()>(dlsym(handle, entryPoint));
+  // cppcheck-suppress resourceLeak ; once loaded it stays, also below
   if (initialize == nullptr) throw std::runtime_error("the component " + library + " has no " + entryPoint);
   if (const unsigned status = initialize()) {
+    // cppcheck-suppress resourceLeak
     throw std::runtime_error("the component " + library + " did not start, status " + std::to_string(status));
   }
+  // cppcheck-suppress resourceLeak
 }
 
 }  // namespace vmqd

@@ -57,6 +57,7 @@ int FSI1_FetchList(FSI1_List* list, FSI1_Entry* entry) try {
   if (list == nullptr || entry == nullptr) return systemError(EINVAL);
   while (true) {
     errno = 0;
+    // cppcheck-suppress readdirCalled ; a list belongs to one thread, and so does its stream
     const dirent* const found = readdir(list->stream);
     if (found == nullptr) return errno == 0 ? FSI1_END_OF_LIST : systemError(errno);
     if (isDirectoryItself(found->d_name)) continue;

@@ -8,6 +8,7 @@ namespace vmqhost {
 
 class LineBuffer {
  public:
+  // cppcheck-suppress uninitMemberVar ; size_ says how much of it is in use
   LineBuffer() = default;
   ~LineBuffer();
   LineBuffer(const LineBuffer&) = delete;

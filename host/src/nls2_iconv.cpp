@@ -63,7 +63,7 @@ class Iconv {
   const iconv_t descriptor_;
 };
 
-class IconvConverter : public Converter {
+class IconvConverter final : public Converter {
  public:
   IconvConverter(const char* name, uint32_t maximum_bytes_per_unit)
       : decoder_(kUnits, name), encoder_(name, kUnits), maximum_bytes_per_unit_(maximum_bytes_per_unit) {

@@ -77,6 +77,7 @@ XML1_Parser* XML1_ParserCreate(const char* encoding) {
   if (int status; vmqhost::seam::fails("XML1_ParserCreate", &status)) return nullptr;
   const XML_Parser expat = XML_ParserCreate(encoding);
   if (expat == nullptr) return nullptr;
+  // cppcheck-suppress legacyUninitvar ; does not understand the initialiser
   auto* const parser = new (std::nothrow) XML1_Parser{.expat = expat};
   if (parser == nullptr) {
     XML_ParserFree(expat);

@@ -57,6 +57,7 @@ std::string stageRestartingInstaller(DaemonFixture& daemon, const SampleHome& ho
                                   pid_file +
                                   "\n"
                                   "until " VMQ_PROGRAMS "/vmqctl status --socket " +
+                                  // cppcheck-suppress ignoredReturnValue ; it is a part of the text
                                   daemon.socket() +
                                   " >/dev/null 2>&1; do sleep 0.1; done\n"
                                   "echo vmqd restarted\n" +

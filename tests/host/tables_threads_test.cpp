@@ -63,6 +63,7 @@ TEST(TableThreads, LoseNoSampledRowToAnEventOfTheSameRequest) {
 TEST(TableThreads, DeliverEventsWhileASampleTakesLong) {
   SampleManager& table = SampleManager::registered("LONG");
   std::mutex sampling;
+  // cppcheck-suppress localMutex ; the routine below locks it on other threads
   sampling.lock();
   std::atomic<bool> started = false;
   table.while_sampling = [&](SampleRequest&) {
