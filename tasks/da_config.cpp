@@ -47,7 +47,7 @@ class DaConfiguration {
   TASK_RC ensureTypeStartsWithAgent();
   TASK_RC replaceModel(const DaConsole& console);
   TASK_RC addToStartup();
-  bool copyFromDepot(const String& name, const String& directory) const;
+  [[nodiscard]] bool copyFromDepot(const String& name, const String& directory) const;
 
   /// Puts the message id and "value" or "value,context" into the request and returns the code.
   TASK_RC fail(TASK_RC rc, const String& value);

@@ -40,6 +40,7 @@ DaConsoleEnd DaConsole::run(const char* command, String& out) const {
   const Trace trace(traceUnit);
   std::vector<std::string> environment = environment_;
   std::vector<char*> entries;
+  entries.reserve(environment.size() + 1);
   for (std::string& entry : environment) entries.push_back(entry.data());
   entries.push_back(nullptr);
   int exitCode = 0;

@@ -44,6 +44,7 @@ bool writeAll(const Trace& trace, FILE* stream, const String& path, const std::s
 
 }  // namespace
 
+// NOLINTNEXTLINE(performance-unnecessary-value-param): the interface passes it by value
 String readFile(String path) {
   const Trace trace(traceUnit);
   Stream stream(fopen(path.toNarrow().c_str(), "rbe"));
@@ -82,6 +83,7 @@ bool writeFile(const String& path, const String& text) {
   return written && closed;
 }
 
+// NOLINTNEXTLINE(performance-unnecessary-value-param): as above
 bool deleteFile(String path) {
   const Trace trace(traceUnit);
   if (unlink(path.toNarrow().c_str()) != 0) {

@@ -30,7 +30,7 @@ String getDaInstanceName(const String& managedSystemName) {
   const Trace trace(traceUnit);
   const String name = beforeType(managedSystemName);
   const unsigned end = endOfInstance(name);
-  const String instance = end == String::NPOS ? String() : name.substr(0, end);
+  String instance = end == String::NPOS ? String() : name.substr(0, end);
   TRACE_DETAIL(trace, "Returning instance <%s> for managed system name <%s>", instance.c_str().get(),
                managedSystemName.c_str().get());
   return instance;

@@ -10,6 +10,7 @@
 
 namespace {
 
+// NOLINTBEGIN(modernize-use-nullptr): 0 is what an ordering is compared with
 bool holds(_IntfOper oper, std::strong_ordering order) {
   switch (oper) {
     case INTF_EQ:
@@ -27,6 +28,7 @@ bool holds(_IntfOper oper, std::strong_ordering order) {
   }
   return false;
 }
+// NOLINTEND(modernize-use-nullptr)
 
 /// A column that nobody filled in holds zero bytes: like blanks, they are no text.
 std::string_view columnText(const char* text, unsigned width) {
@@ -47,7 +49,7 @@ std::strong_ordering comparePadded(std::string_view left, std::string_view right
   const size_t common = std::min(left.size(), right.size());
   if (const int order = std::memcmp(left.data(), right.data(), common); order != 0) return order <=> 0;
   if (left.size() > common) return compareWithBlanks(left.substr(common));
-  return 0 <=> compareWithBlanks(right.substr(common));
+  return 0 <=> compareWithBlanks(right.substr(common));  // NOLINT(modernize-use-nullptr): as above
 }
 
 }  // namespace

@@ -39,7 +39,7 @@ bool isDirectoryItself(const char* name) {
 int FSI1_NewList(const char* directory, FSI1_List** list) try {
   if (int status; vmqhost::seam::fails("FSI1_NewList", &status)) return status;
   if (directory == nullptr || list == nullptr) return systemError(EINVAL);
-  auto opened = new FSI1_List{nullptr, directory, {}};
+  auto* const opened = new FSI1_List{nullptr, directory, {}};
   opened->stream = opendir(directory);
   if (opened->stream == nullptr) {
     const int error = errno;

@@ -30,7 +30,7 @@ class Iconv {
   Iconv(const Iconv&) = delete;
   Iconv& operator=(const Iconv&) = delete;
 
-  [[nodiscard]] bool valid() const { return descriptor_ != reinterpret_cast<iconv_t>(-1); }
+  [[nodiscard]] bool valid() const { return descriptor_ != kNone; }
 
   /// Converts from `In` to `Out` elements; an element that means nothing is replaced by `replace(element)`.
   template <class In, class Out, class Replace>
@@ -60,6 +60,7 @@ class Iconv {
 
  private:
   static constexpr auto kFailed = static_cast<size_t>(-1);
+  static inline const auto kNone = reinterpret_cast<iconv_t>(-1);  // NOLINT(performance-no-int-to-ptr): iconv's own
   const iconv_t descriptor_;
 };
 
@@ -67,6 +68,7 @@ class IconvConverter final : public Converter {
  public:
   IconvConverter(const char* name, uint32_t maximum_bytes_per_unit)
       : decoder_(kUnits, name), encoder_(name, kUnits), maximum_bytes_per_unit_(maximum_bytes_per_unit) {
+    // NOLINTNEXTLINE(cppcoreguidelines-prefer-member-initializer): asks an object that is whole
     ascii_is_ascii_ = valid() && asciiConvertsToItself();
   }
 
