@@ -46,7 +46,7 @@ constexpr Key keys[] = {
      "path of the socket (/run/vmqd/vmqd.sock); its directory must exist"},
     {"library", "", [](auto& c, auto v) { c.library = absolutePath(v); },
      "path of libvmq.so (the one installed with this program)"},
-    {"home", "CORVELHOME", [](auto& c, auto v) { c.home = existingDirectory(v); },
+    {"home", "CORVELHOME", [](auto& c, auto v) { c.home = existingDirectory(plainPath(v)); },
      "installation home of the agents; required"},
     {"depot", "QORDEPLOY_AGENTDEPOT", checked<plainPath>, "where deployed files arrive (the home)"},
     {"node", "", [](auto& c, auto v) { c.node = nodeName(v); }, "name of this node (the host name)"},

@@ -19,8 +19,8 @@ class BadValue : public std::runtime_error {
 std::string absolutePath(std::string_view value);
 /// An absolute path of a directory that exists.
 std::string existingDirectory(std::string_view value);
-/// An absolute path that a shell reads as one word and as nothing but itself: generated scripts name the depot
-/// unquoted.
+/// An absolute path that a shell reads as one word and as nothing but itself: command lines name the home, and
+/// generated scripts the depot, unquoted.
 std::string plainPath(std::string_view value);
 /// An absolute path that fits into a socket's address.
 std::string socketPath(std::string_view value);

@@ -99,6 +99,16 @@ void warn(const Service& service) {
   if (service.tables.empty()) logWarning("the component has registered no tables");
 }
 
+/// The script around an installer that restarts the daemon removes the outcome of the one before by its bare name,
+/// "rc.txt", so it has to begin in the depot: elsewhere it would spare that outcome, and remove what is none.
+/// REQUIRES: everything that a relative path names is open, and the component has made the depot.
+void workInDepot(const ServiceSettings& settings) {
+  const std::string& depot = settings.depot.empty() ? settings.home : settings.depot;
+  const bool is_relative = depot.front() != '/';  // from the environment that vmqd was started with
+  if (is_relative || chdir(depot.c_str()) == 0 || errno == ENOENT) return;  // without a depot nothing is installed
+  logWarning(withReason("the depot " + depot + " cannot be worked in", errno));
+}
+
 void tell(const ServiceManager& manager, const char* state) {
   if (const int error = manager.notify(state)) logWarning(withReason("the service manager", error));
 }
@@ -123,6 +133,7 @@ int run(const Configuration& configuration) {
   settings.depot = environmentValue("QORDEPLOY_AGENTDEPOT");
   vmqhost::setOriginNode(settings.node);
   loadComponent(configuration.library.empty() ? defaultLibrary() : configuration.library);
+  workInDepot(settings);
 
   Service service(settings, vmqhost::listTables());
   warn(service);

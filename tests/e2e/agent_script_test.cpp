@@ -5,6 +5,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <filesystem>
 #include <fstream>
 #include <stdexcept>
@@ -216,7 +217,11 @@ TEST_F(AgentScript, ConfigurationThatCannotBeUsedIsNamed) {
       {"PROGRAM=/no/such/program", "ux: there is no program \"/no/such/program\" (PROGRAM in "},
       {"PORT=", "ux: PORT in "},
       {"PORT=http", "ux: PORT in "},
+      {"PORT=0", "ux: PORT in "},
+      {"PORT=65536", "ux: PORT in "},
+      {"PORT=99999999999999999999", "ux: PORT in "},
       {"WAIT_SECONDS=soon", "ux: WAIT_SECONDS in "},
+      {"WAIT_SECONDS=86401", "ux: WAIT_SECONDS in "},
   };
   const std::string good = readWholeFile(home / "config/ux.config");
   for (const auto& bad : cases) {
@@ -224,9 +229,26 @@ TEST_F(AgentScript, ConfigurationThatCannotBeUsedIsNamed) {
     home.configure("ux", bad.line);
     const Outcome outcome = home.control("start ux");
     EXPECT_EQ(outcome.exit_code, 1);
-    EXPECT_THAT(outcome.output, HasSubstr(bad.complaint));
+    EXPECT_THAT(outcome.output, HasSubstr(std::string("CorvelAgent: ") + bad.complaint));
+    EXPECT_EQ(std::count(outcome.output.begin(), outcome.output.end(), '\n'), 1) << outcome.output;
     std::ofstream(home / "config/ux.config") << good;
   }
+}
+
+TEST_F(AgentScript, NumbersMayBeginWithAZero) {
+  home.configure("ux", "WAIT_SECONDS=08");
+  succeed("start ux");
+  succeed("stop ux");
+}
+
+TEST_F(AgentScript, DataProvidersComeFromAListThatNeedNotBeUtf8) {
+  std::ofstream(home / "config/.ConfigData/kumenv") << "# f\xFCr\nlx8266|DATAPROVIDER|POST,\xFC|\n";
+  const std::string before = readWholeFile(home / "config/um.config");
+  std::ofstream(home / "config/um.config") << before.substr(0, before.size() - 1);  // no line end at its end
+  ASSERT_EQ(runShell("LC_ALL=C.UTF-8 " + quoted(home / "bin/CorvelAgent") + " -h " + quoted(home.path()) + " start um")
+                .exit_code,
+            0);
+  EXPECT_THAT(readWholeFile(home / "config/um.config"), testing::EndsWith("\nKUMA_STARTUP_DP='POST,\xFC'\n"));
 }
 
 TEST_F(AgentScript, ConfigurationIsReadAndNotExecuted) {

@@ -2,12 +2,25 @@
 
 #include <signal.h>
 
+#include <filesystem>
+
 #include "tests/e2e/deployment.h"
 #include "tests/e2e/loopback.h"
 
 namespace {
 
-class DaemonLife : public Deployment {};
+class DaemonLife : public Deployment {
+ protected:
+  [[nodiscard]] std::string workingDirectory() const {
+    return std::filesystem::read_symlink("/proc/" + std::to_string(daemon->process().pid()) + "/cwd");
+  }
+};
+
+// So that a script of its own that removes a file by a bare name removes none elsewhere.
+TEST_F(DaemonLife, WorksInItsDepot) {
+  startDaemon();
+  EXPECT_EQ(workingDirectory(), std::filesystem::canonical(daemon->depot()));
+}
 
 TEST_F(DaemonLife, AgentOutlivesAKilledDaemonAndTheNextOneCanStopIt) {
   startDaemon();

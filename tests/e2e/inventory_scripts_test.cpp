@@ -55,6 +55,34 @@ TEST_F(SampleTools, InventoryOfOthersIsWhatRegisteredItself) {
   EXPECT_THAT(inventory("-d").output, testing::Not(HasSubstr("rp")));
 }
 
+TEST_F(SampleTools, LinesThatAreNotUtf8AreLines) {
+  const std::string line = "\"zz\",\"\xFCnix \\n\",\"lx8266\",\"1\",\"1\"\n";
+  std::ofstream(home / "registry/products.tbl", std::ios::app) << line;
+  const std::string utf8 = "LC_ALL=C.UTF-8 ";
+  const std::string qinfo = utf8 + quoted(home / "bin/qinfo");
+  EXPECT_EQ(runShell(qinfo + " -p zz").output, "Platform codes:\nlx8266 Product (zz)\n");
+  fs::copy_file(home / "config/ux_inst1.config", home / "config/zz.config");
+  (void)home.writeProgram("bin/CorvelAgent", "case $* in *' status zz') ;; *' status '*) exit 3 ;; esac");
+  EXPECT_EQ(runShell(qinfo + " -r").output, header + line);
+
+  EXPECT_EQ(runShell(utf8 + quoted(home / "bin/uninstall.sh") + " -i ux lx8266").exit_code, 0);
+  const std::string left = readWholeFile(home / "registry/products.tbl");
+  EXPECT_THAT(left, testing::Not(HasSubstr("\"ux\"")));
+  EXPECT_THAT(left, testing::EndsWith(line));
+}
+
+TEST_F(SampleTools, ConfigurationsThatAreNotUtf8AreTranslatedWhole) {
+  const std::string settings = "PORT=1\n# f\xFCr alle\nWAIT_SECONDS=7\nPROGRAM=/opt/\xFC/program\n";
+  const std::string file = home / "new.cfg";
+  std::ofstream(file) << "INSTANCE=inst2\n" + settings;
+  const std::string tool = "LC_ALL=C.UTF-8 " + quoted(home / "zlpqor6/lx8266/bin/vmq_xa");
+  const Outcome put = runShell(tool + " -p inst2 -pc ux <" + quoted(file));
+  EXPECT_EQ(put.exit_code, 0) << put.output;
+  EXPECT_EQ(readWholeFile(home / "config/ux_inst2.config"), settings);
+  EXPECT_EQ(runShell(tool + " -g inst2 -pc ux").output,
+            "INSTANCE=inst2\nPORT=1\nWAIT_SECONDS=7\nPROGRAM=/opt/\xFC/program\n");
+}
+
 // As it is called when it is looked up where the libraries are.
 TEST_F(SampleTools, InventoryTakesAnEmptyLastArgument) {
   EXPECT_EQ(inventory("-d ''").output, inventory("-d").output);
@@ -127,7 +155,8 @@ TEST_F(SampleTools, TranslatorWithoutANameMeansTheAgentItself) {
 
 TEST_F(SampleTools, TranslatorRefusesSettingsItDoesNotKnowAndKeepsTheOldOnes) {
   const std::string before = readWholeFile(home / "config/ux_inst1.config");
-  for (const char* text : {"", "FOO=1", "PORT=", "PORT=1\nFOO=1", "PORT=1\nPROGRAM=relative", "PORT=x"}) {
+  for (const char* text : {"", "FOO=1", "PORT=", "PORT=1\nFOO=1", "PORT=1\nPROGRAM=relative", "PORT=x", "PORT=0",
+                           "PORT=65536", "PORT=99999999999999999999"}) {
     const Outcome outcome = translator("-p inst1 -pc ux <<'END'\n" + std::string(text) + "\nEND");
     EXPECT_EQ(outcome.exit_code, 1) << text;
     EXPECT_EQ(readWholeFile(home / "config/ux_inst1.config"), before) << text;

@@ -96,6 +96,22 @@ TEST_F(RestartInstall, InstallerThatLeavesTheDaemonAloneIsToldTwice) {
   EXPECT_THAT(readWholeFile(inDepot("stderr.txt")), HasSubstr("usage: install.sh HOME [RESPONSES]"));
 }
 
+// The script around the installer removes the earlier outcome by a name without a folder.
+TEST_F(RestartInstall, OutcomeOfAnEarlierOneIsNotTakenForThatOfOneThatStillRuns) {
+  std::ofstream(inDepot("rc.txt")) << "0\n";
+  std::ofstream(inDepot("ux/010100000/wait.sh")) << "#!/bin/sh\necho >" + (home / "begun") + "\nuntil [ -e " +
+                                                        (home / "may-end") + " ]; do sleep 0.1; done\nexit 7\n";
+  fs::permissions(inDepot("ux/010100000/wait.sh"), fs::perms(0770));
+  ASSERT_EQ(vmqctl("install ux --version 010100000 --restart --command '|DEPLOYDIR|/wait.sh'").exit_code, 0);
+  ASSERT_TRUE(soon([this] { return fs::exists(home / "begun"); }));
+  const Outcome early = vmqctl("complete-install");
+  std::ofstream(home / "may-end") << "";
+  EXPECT_EQ(early.exit_code, 1);
+  EXPECT_THAT(early.output, HasSubstr("(parameters: " + inDepot("rc.txt") + ",NOTFOUND)"));
+  ASSERT_TRUE(exitCodeIsKept(*daemon));
+  EXPECT_THAT(vmqctl("complete-install").output, HasSubstr("(parameters: " + inDepot("rc.txt") + ",7)"));
+}
+
 TEST_F(RestartInstall, WithoutATranslatorNothingIsRun) {
   fs::remove(home / "zlpqor6/lx8266/bin/vmq_xa");
   const Outcome refused = vmqctl("install ux --version 010100000 --restart --command '|DEPLOYDIR|/install.sh'");

@@ -7,6 +7,8 @@
 # zlpqor6/PLATFORM/PRODUCT, and its line in the inventory. Configuration and logs stay.
 # Exit status: 0 removed; 1 failed; 64 command line not understood.
 set -u
+LC_ALL=C # lines are bytes: none is left out because it is not UTF-8
+export LC_ALL
 
 home=$(cd "$(dirname "$0")/.." && pwd)
 products=$home/registry/products.tbl
@@ -23,8 +25,8 @@ fi
 case $2$3 in *[!A-Za-z0-9]*) fail "\"$2\" for \"$3\" is not the name of a product and a platform" ;; esac
 [ "$2" != ax ] || fail "product \"ax\" cannot be removed: the others need it"
 
-others=$(grep -v "^\"$2\",\"[^\"]*\",\"$3\"," "$products")
-[ "$others" != "$(cat "$products")" ] || fail "product \"$2\" is not installed for $3"
+line="^\"$2\",\"[^\"]*\",\"$3\","
+grep -q "$line" "$products" || fail "product \"$2\" is not installed for $3"
 
 for config in "$home/config/$2.config" "$home/config/$2"_*.config; do
   [ -e "$config" ] || continue
@@ -34,6 +36,6 @@ for config in "$home/config/$2.config" "$home/config/$2"_*.config; do
 done
 
 rm -rf "$home/zlpqor6/$3/$2" || fail "cannot remove $home/zlpqor6/$3/$2"
-echo "$others" >"$products.new" || fail "cannot write in $home/registry"
+sed "/$line/d" "$products" >"$products.new" || fail "cannot write in $home/registry"
 mv "$products.new" "$products" || fail "cannot write $products"
 echo "$2 removed"

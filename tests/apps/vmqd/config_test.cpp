@@ -5,6 +5,7 @@
 #include <gmock/gmock.h>
 #include <sys/stat.h>
 
+#include <filesystem>
 #include <string>
 
 #include "tests/support/temporary_directory.h"
@@ -181,6 +182,12 @@ TEST(Configuration, TheHomeIsADirectoryThatExists) {
   EXPECT_EQ("f:1: home: must be an absolute path", complaintAbout("home = ."));
   EXPECT_EQ("f:1: home: /does/not/exist: No such file or directory", complaintAbout("home = /does/not/exist"));
   EXPECT_EQ("f:1: home: /dev/null is not a directory", complaintAbout("home = /dev/null"));
+  const TemporaryDirectory directory;
+  for (const char* const name : {"my home", "h$(id)", "h;id", "h'"}) {
+    std::filesystem::create_directory(directory.path() / name);
+    EXPECT_EQ("f:1: home: must not hold white space or characters that a shell interprets",
+              complaintAbout("home = " + (directory / name)));
+  }
 }
 
 TEST(ConfigurationFile, IsReadWhole) {

@@ -8,10 +8,21 @@
 # that run go on as they are until they are restarted.
 # Exit status: 0 done; 1 failed; 64 command line not understood.
 set -u
+LC_ALL=C # lines are bytes: none is left out because it is not UTF-8
+export LC_ALL
 
 fail() {
   echo "install.sh: $*" >&2
   exit 1
+}
+
+# Each file is written under another name until it is whole: what was there before stays when the disk is full.
+new=''
+trap '[ -z "$new" ] || rm -f "$new"' EXIT
+
+# becomes FILE: what has been written takes the place of the file.
+becomes() {
+  mv "$new" "$1" || fail "cannot write $1"
 }
 
 # response KEY: its value. Response files keep the line ends that they were sent with.
@@ -37,23 +48,29 @@ products=$home/registry/products.tbl
 platform=$(sed -n 's/^"ax","[^"]*","\([^"]*\)".*/\1/p' "$products" | head -n 1)
 [ -n "$platform" ] || fail "$products lists no product ax, so the platform is not known"
 
-# The program first, under another name until it is whole: an agent may be running from the old one.
+# An agent may be running from the old program.
 program=$home/zlpqor6/$platform/ux/bin/prometheus-node-exporter
 mkdir -p "${program%/*}" || fail "cannot write in $home/zlpqor6"
-cp "$here/prometheus-node-exporter" "$program.new" || fail "cannot copy the program"
-chmod 755 "$program.new"
-mv "$program.new" "$program" || fail "cannot write $program"
+new=$program.new
+cp "$here/prometheus-node-exporter" "$new" && chmod 755 "$new" || fail "cannot copy the program"
+becomes "$program"
 
-[ -e "$home/config/ux.config" ] || echo "PORT=$(response PORT)" >"$home/config/ux.config"
+if [ ! -e "$home/config/ux.config" ]; then
+  new=$home/config/ux.config.new
+  echo "PORT=$(response PORT)" >"$new" || fail "cannot write in $home/config"
+  becomes "$home/config/ux.config"
+fi
 for config in "$home"/config/ux.config "$home"/config/ux_*.config; do
   [ -e "$config" ] || continue
-  { sed '/^PROGRAM=/d' "$config" && echo "PROGRAM=$program"; } >"$config.new" || fail "cannot write in $home/config"
-  mv "$config.new" "$config" || fail "cannot write $config"
+  new=$config.new
+  { awk '!/^PROGRAM=/' "$config" && echo "PROGRAM=$program"; } >"$new" || fail "cannot write in $home/config"
+  becomes "$config"
 done
 
+new=$products.new
 {
-  echo "\"ux\",\"Unix host agent\",\"$platform\",\"$version\",\"100\""
-  grep -v '^"ux",' "$products"
-} >"$products.new"
-mv "$products.new" "$products" || fail "cannot write $products"
+  echo "\"ux\",\"Unix host agent\",\"$platform\",\"$version\",\"100\"" &&
+    awk '!/^"ux",/' "$products"
+} >"$new" || fail "cannot write in $home/registry"
+becomes "$products"
 echo "ux $version installed for $platform"
