@@ -186,13 +186,7 @@ Json ApiClient::get(const std::string& target) {
 }
 
 std::vector<Json> ApiClient::query(const std::string& table, const Predicates& predicates) {
-  std::string body;
-  try {
-    body = Json{{"predicates", toJson(predicates)}}.dump();
-  } catch (const Json::type_error&) {
-    throw Failure(ExitCode::Usage, "A value of the request is not UTF-8 text.", "Give it in UTF-8.");
-  }
-  const Json answer = exchange({tableTarget(table) + "/query", body});
+  const Json answer = exchange({tableTarget(table) + "/query", queryBody(predicates)});
   if (!answer.is_object() || !answer.contains("rows") || !answer["rows"].is_array()) {
     notUnderstood(loop_.socket(), "it has no rows");
   }

@@ -1,5 +1,5 @@
 #pragma once
-// The command line.
+// The command line of vmqctl.
 
 #include <optional>
 #include <string>
@@ -8,13 +8,15 @@
 
 namespace vmqctl {
 
-struct CommandLine {
+/// What a command line asks for.
+struct Invocation {
   Settings settings;
+  unsigned defaultTimeoutSeconds = 0;  ///< of the verb; 0 for no limit
   Action action;
 };
 
 /// Reads the command line. Returns the text to print when it asks for help or for the version; else fills result.
 /// Throws a Failure of usage.
-std::optional<std::string> parseCommandLine(int argc, const char* const* argv, CommandLine& result);
+std::optional<std::string> parseCommandLine(int argc, const char* const* argv, Invocation& result);
 
 }  // namespace vmqctl

@@ -1,5 +1,8 @@
 // vmqctl, the operator's client of vmqd.
 
+#include <fcntl.h>
+#include <unistd.h>
+
 #include <new>
 
 #include "apps/vmqctl/cli.h"
@@ -9,20 +12,28 @@ namespace {
 
 using namespace vmqctl;
 
+/// A file or socket that is opened must not become a standard stream because that was closed: what is said would go
+/// into it.
+void openStandardStreams() {
+  int descriptor = 0;
+  while (descriptor >= 0 && descriptor <= STDERR_FILENO) descriptor = open("/dev/null", O_RDWR);
+  if (descriptor > STDERR_FILENO) (void)close(descriptor);  // they were open already
+}
+
 ExitCode run(int argc, char** argv, const Console& console) {
-  CommandLine commandLine;
-  if (const std::optional<std::string> text = parseCommandLine(argc, argv, commandLine)) {
+  Invocation invocation;
+  if (const std::optional<std::string> text = parseCommandLine(argc, argv, invocation)) {
     console.data(*text);
     return ExitCode::Done;
   }
-  Session session(console, commandLine.settings, commandLine.action.defaultTimeoutSeconds);
+  Session session(console, invocation.settings, invocation.defaultTimeoutSeconds);
   try {
-    return commandLine.action.run(session);
+    return invocation.action(session);
   } catch (const Interrupted&) {
     throw Failure(ExitCode::Interrupted, "Interrupted while waiting for the daemon.");
   } catch (const TimedOut&) {
     throw Failure(ExitCode::TimedOut,
-                  "The daemon did not answer within " + std::to_string(session.timeoutSeconds) + " seconds.",
+                  "The daemon did not answer within " + counted(session.timeoutSeconds, "second") + ".",
                   "Allow it more with --timeout.");
   }
 }
@@ -30,6 +41,7 @@ ExitCode run(int argc, char** argv, const Console& console) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  openStandardStreams();
   const Console console = Console::ofThisProcess();
   try {
     return static_cast<int>(run(argc, argv, console));

@@ -59,6 +59,23 @@ Json toJson(const Predicates& predicates) {
   return object;
 }
 
+std::string queryBody(const Predicates& predicates) {
+  for (const Predicate& p : predicates) {
+    if (p.value.size() <= maximumValueBytes) continue;
+    throw Failure(ExitCode::Usage, "The value of " + p.column + " has " + std::to_string(p.value.size()) +
+                                       " bytes; a request holds at most " + std::to_string(maximumValueBytes) + ".");
+  }
+  try {
+    return Json{{"predicates", toJson(predicates)}}.dump();
+  } catch (const Json::type_error&) {
+    throw Failure(ExitCode::Usage, "A value of the request is not UTF-8 text.", "Give it in UTF-8.");
+  }
+}
+
+void checkSendable(const Predicates& predicates) {
+  (void)queryBody(predicates);
+}
+
 std::string percentEncoded(std::string_view text) {
   return encoded(text, unreserved);
 }

@@ -20,15 +20,13 @@ Session::Session(const Console& theConsole, const Settings& settings, unsigned d
 
 std::string socketPath(const Settings& settings) {
   const char* fromEnvironment = std::getenv("VMQ_SOCKET");
-  const std::string path = settings.socket                                          ? *settings.socket
+  const std::string path = !settings.socket.empty()                                 ? settings.socket
                            : fromEnvironment != nullptr && *fromEnvironment != '\0' ? fromEnvironment
                                                                                     : defaultSocket;
   constexpr std::size_t room = sizeof(sockaddr_un::sun_path);
-  if (path.empty() || path.size() >= room) {
-    throw Failure(
-        ExitCode::Usage,
-        path.empty() ? "The path of the socket is empty." : "The path of the socket is too long: " + path + ".",
-        "Give --socket a path of 1 to " + std::to_string(room - 1) + " bytes.");
+  if (path.size() >= room) {
+    throw Failure(ExitCode::Usage, "The path of the socket is too long: " + path + ".",
+                  "Give --socket a path of at most " + std::to_string(room - 1) + " bytes.");
   }
   return path;
 }

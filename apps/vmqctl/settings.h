@@ -12,7 +12,7 @@
 namespace vmqctl {
 
 struct Settings {
-  std::optional<std::string> socket;  ///< --socket
+  std::string socket;  ///< --socket; "" without it
   Format format = Format::AsTable;
   std::optional<unsigned> timeoutSeconds;  ///< --timeout; 0 for no limit
 };
@@ -35,10 +35,7 @@ std::string socketPath(const Settings& settings);
 
 constexpr const char* defaultSocket = "/run/vmqd/vmqd.sock";
 
-/// A verb of the command line, chosen and with its arguments.
-struct Action {
-  unsigned defaultTimeoutSeconds = 0;
-  std::function<ExitCode(Session&)> run;
-};
+/// What a verb does with the arguments that it was given.
+using Action = std::function<ExitCode(Session&)>;
 
 }  // namespace vmqctl

@@ -107,6 +107,10 @@ std::string escaped(std::string_view text, Charset charset) {
   return result;
 }
 
+std::string counted(std::uint64_t count, const char* what) {
+  return std::to_string(count) + " " + what + (count == 1 ? "" : "s");
+}
+
 Extent within(std::string_view text, std::size_t limit) {
   Extent extent;
   while (extent.bytes < text.size()) {

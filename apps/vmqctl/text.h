@@ -1,6 +1,7 @@
 #pragma once
 // Text from elsewhere, made fit for a person's terminal: nothing in it can move the cursor, colour or hide anything.
 
+#include <cstdint>
 #include <string>
 #include <string_view>
 
@@ -12,6 +13,9 @@ enum class Charset { Utf8, Ascii };
 /// print or changes the direction of writing, "\xff" for bytes that are not UTF-8. With Charset::Ascii every character
 /// above 126 is escaped, for terminals that do not read UTF-8 and would take a part of a character as a command.
 std::string escaped(std::string_view text, Charset charset);
+
+/// "1 second", "2 seconds".
+std::string counted(std::uint64_t count, const char* what);
 
 struct Extent {
   std::size_t bytes = 0;

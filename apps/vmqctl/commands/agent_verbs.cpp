@@ -3,6 +3,7 @@
 #include <memory>
 
 #include "apps/vmqctl/commands/request_options.h"
+#include "apps/vmqctl/commands/verbs.h"
 #include "apps/vmqctl/failure.h"
 
 namespace vmqctl {
@@ -62,28 +63,20 @@ Request requestOf(const AgentVerb& verb, const Arguments& arguments) {
 
 }  // namespace
 
-void addAgentVerbs(CLI::App& app, Invocation& invocation) {
-  for (const AgentVerb& verb : agentVerbs) {
+void addAgentVerbs(Verbs& verbs) {
+  for (const AgentVerb& each : agentVerbs) {
     const auto arguments = std::make_shared<Arguments>();
-    CLI::App* sub = app.add_subcommand(verb.name, verb.description);
-    sub->add_option("PRODUCT", arguments->product, "Product code of the agent, such as ux")
-        ->type_name("")
-        ->required()
-        ->check(notEmpty);
-    CLI::Option* target =
-        sub->add_option("--target", arguments->target, "Managed system name; its instance is looked up");
-    target->type_name("MSN")->check(notEmpty);
-    sub->add_option("--instance", arguments->instance,
-                    verb.takesInstance ? "Name of the instance, not looked up" : "Not for this verb; use --target")
-        ->type_name("NAME")
-        ->check(notEmpty)
-        ->excludes(target);
-    addRequestOptions(*sub, arguments->request, Request::Outcome::Queued);
-    addCommonOptions(*sub, invocation, defaultTimeoutSeconds);
-    sub->footer(std::string("Examples:\n") + verb.example);
-    sub->callback([&invocation, &verb, arguments] {
-      invocation.action = requestAction(requestOf(verb, *arguments), arguments->request, defaultTimeoutSeconds);
+    Verb verb = verbs.add(each.name, each.description, defaultTimeoutSeconds, [&each, arguments] {
+      return requestAction(requestOf(each, *arguments), arguments->request);
     });
+    verb.text("PRODUCT", arguments->product, "Product code of the agent, such as ux").required();
+    const Argument target =
+        verb.text("--target MSN", arguments->target, "Managed system name; its instance is looked up");
+    verb.text("--instance NAME", arguments->instance,
+              each.takesInstance ? "Name of the instance, not looked up" : "Not for this verb; use --target")
+        .excludes(target);
+    addRequestOptions(verb, arguments->request, Request::Outcome::Queued);
+    verb.footer(std::string("Examples:\n") + each.example);
   }
 }
 

@@ -8,6 +8,7 @@
 #include <memory>
 
 #include "apps/vmqctl/failure.h"
+#include "apps/vmqctl/predicates.h"
 
 namespace vmqctl {
 namespace {
@@ -28,9 +29,9 @@ std::string inputText(const std::string& file) {
   char block[4096];
   while (const std::size_t count = std::fread(block, 1, sizeof block, stream.get())) {
     text.append(block, count);
-    if (text.size() > maximumParameterBytes) {
+    if (text.size() > maximumValueBytes) {
       throw Failure(ExitCode::Usage,
-                    name + " is too long: a request holds at most " + std::to_string(maximumParameterBytes) + " bytes.",
+                    name + " is too long: a request holds at most " + std::to_string(maximumValueBytes) + " bytes.",
                     "");
     }
   }

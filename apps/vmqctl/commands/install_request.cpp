@@ -2,34 +2,26 @@
 
 #include "apps/vmqctl/commands/install_request.h"
 
-#include "apps/vmqctl/commands/verbs.h"
-
 namespace vmqctl {
 
-void takesProduct(CLI::App& verb, InstallArguments& a) {
-  verb.add_option("PRODUCT", a.product, "Product code, such as ux")->type_name("")->required()->check(notEmpty);
+Argument takesProduct(Verb& verb, InstallArguments& a) {
+  return verb.text("PRODUCT", a.product, "Product code, such as ux").required();
 }
 
-void takesVersion(CLI::App& verb, InstallArguments& a, bool required) {
-  verb.add_option("--version", a.version, "Version of the product, such as 06.20")
-      ->type_name("V")
-      ->required(required)
-      ->check(notEmpty);
+Argument takesVersion(Verb& verb, InstallArguments& a) {
+  return verb.text("--version V", a.version, "Version of the product, such as 06.20");
 }
 
-void takesCommand(CLI::App& verb, InstallArguments& a, bool required, const char* description) {
-  verb.add_option("--command", a.installer,
-                  std::string(description) + "; |DEPLOYDIR|, |DEPOTDIR| and |CORVELHOME| are replaced")
-      ->type_name("CMD")
-      ->required(required)
-      ->check(notEmpty);
+Argument takesCommand(Verb& verb, InstallArguments& a, const std::string& description) {
+  return verb.text("--command CMD", a.installer,
+                   description + "; |DEPLOYDIR|, |DEPOTDIR| and |CORVELHOME| are replaced");
 }
 
-void takesInstallSteps(CLI::App& verb, InstallArguments& a) {
-  CLI::Option* const setRms =
-      verb.add_flag("--set-rms", a.setRms, "Afterwards register the product with its management server");
-  verb.add_flag("--restart", a.restart, "The installer restarts vmqd; ask complete-install for its outcome")
-      ->excludes(setRms);
+void takesInstallSteps(Verb& verb, InstallArguments& a) {
+  const Argument setRms =
+      verb.flag("--set-rms", a.setRms, "Afterwards register the product with its management server");
+  verb.flag("--restart", a.restart, "The installer restarts vmqd; ask complete-install for its outcome")
+      .excludes(setRms);
 }
 
 Request installRequest(const InstallArguments& a) {

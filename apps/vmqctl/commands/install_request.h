@@ -1,9 +1,9 @@
 #pragma once
 // The request that runs a product's installer, and its options: for every verb that ends in an install.
 
-#include <CLI/CLI.hpp>
 #include <string>
 
+#include "apps/vmqctl/command_line.h"
 #include "apps/vmqctl/commands/request.h"
 
 namespace vmqctl {
@@ -19,12 +19,12 @@ struct InstallArguments {
   bool restart = false;
 };
 
-void takesProduct(CLI::App& verb, InstallArguments& arguments);
-void takesVersion(CLI::App& verb, InstallArguments& arguments, bool required);
+Argument takesProduct(Verb& verb, InstallArguments& arguments);
+Argument takesVersion(Verb& verb, InstallArguments& arguments);
 /// --command; `description` begins its help.
-void takesCommand(CLI::App& verb, InstallArguments& arguments, bool required, const char* description);
+Argument takesCommand(Verb& verb, InstallArguments& arguments, const std::string& description);
 /// --set-rms and --restart.
-void takesInstallSteps(CLI::App& verb, InstallArguments& arguments);
+void takesInstallSteps(Verb& verb, InstallArguments& arguments);
 
 Request installRequest(const InstallArguments& arguments);
 

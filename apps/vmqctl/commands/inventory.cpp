@@ -26,23 +26,22 @@ ExitCode run(Session& session, const Predicates& predicates) {
 
 }  // namespace
 
-void addInventory(CLI::App& app, Invocation& invocation) {
+void addInventory(Verbs& verbs) {
   const auto running = std::make_shared<bool>(false);
   const auto product = std::make_shared<std::string>();
-  CLI::App* const sub = app.add_subcommand("inventory", "List the installed products.");
-  sub->add_option("PRODUCT", *product, "Only this product code")->type_name("")->check(notEmpty);
-  sub->add_flag("--running", *running, "Only products that run");
-  addCommonOptions(*sub, invocation, defaultTimeoutSeconds);
-  sub->footer(
-      "Examples:\n"
-      "  vmqctl inventory\n"
-      "  vmqctl inventory ux -o json");
-  sub->callback([&invocation, running, product] {
+  Verb verb = verbs.add("inventory", "List the installed products.", defaultTimeoutSeconds, [running, product] {
     Predicates predicates;
     if (!product->empty()) predicates.push_back({"PRODUCT", "eq", *product});
     if (*running) predicates.push_back({"PRODDESC", "eq", "RUNNING"});
-    invocation.action = {defaultTimeoutSeconds, [predicates](Session& session) { return run(session, predicates); }};
+    checkSendable(predicates);
+    return [predicates](Session& session) { return run(session, predicates); };
   });
+  verb.text("PRODUCT", *product, "Only this product code");
+  verb.flag("--running", *running, "Only products that run");
+  verb.footer(
+      "Examples:\n"
+      "  vmqctl inventory\n"
+      "  vmqctl inventory ux -o json");
 }
 
 }  // namespace vmqctl

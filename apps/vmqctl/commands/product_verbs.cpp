@@ -1,12 +1,14 @@
 // install, complete-install, uninstall, get-config, set-config, remove-instance, set-da-config.
 
 #include <memory>
+#include <optional>
 #include <vector>
 
 #include "apps/vmqctl/commands/input_text.h"
 #include "apps/vmqctl/commands/install_request.h"
 #include "apps/vmqctl/commands/request_options.h"
 #include "apps/vmqctl/commands/result.h"
+#include "apps/vmqctl/commands/verbs.h"
 #include "apps/vmqctl/failure.h"
 
 namespace vmqctl {
@@ -21,7 +23,7 @@ struct Arguments : InstallArguments {
   std::string file;
   std::string model;
   std::vector<std::string> scripts;
-  unsigned port = 0;
+  std::optional<unsigned> port;
   RequestArguments request;
 };
 
@@ -33,51 +35,50 @@ std::string joined(const std::vector<std::string>& words) {
 
 // ---- options -------------------------------------------------------------------------------------------------------
 
-void takesTarget(CLI::App& verb, Arguments& a, const char* description) {
-  verb.add_option("--target", a.target, description)->type_name("MSN")->check(notEmpty);
+void takesTarget(Verb& verb, Arguments& a, const char* description) {
+  verb.text("--target MSN", a.target, description);
 }
 
-void addInstallOptions(CLI::App& verb, Arguments& a) {
+void addInstallOptions(Verb& verb, Arguments& a) {
   takesProduct(verb, a);
-  takesVersion(verb, a, /*required=*/true);
-  takesCommand(verb, a, /*required=*/true, "The installer's command line");
+  takesVersion(verb, a).required();
+  takesCommand(verb, a, "The installer's command line").required();
   takesInstallSteps(verb, a);
 }
 
-void addUninstallOptions(CLI::App& verb, Arguments& a) {
+void addUninstallOptions(Verb& verb, Arguments& a) {
   takesProduct(verb, a);
-  takesVersion(verb, a, /*required=*/false);
-  takesCommand(verb, a, /*required=*/false, "For products that the inventory does not know: what installed them");
+  takesVersion(verb, a);
+  takesCommand(verb, a, "For products that the inventory does not know: what installed them");
 }
 
-void addGetConfigOptions(CLI::App& verb, Arguments& a) {
+void addGetConfigOptions(Verb& verb, Arguments& a) {
   takesProduct(verb, a);
   takesTarget(verb, a, "Managed system name or instance");
 }
 
-void addSetConfigOptions(CLI::App& verb, Arguments& a) {
+void addSetConfigOptions(Verb& verb, Arguments& a) {
   addGetConfigOptions(verb, a);
-  verb.add_option("FILE", a.file, "The configuration; \"-\", or none, for standard input")->type_name("");
+  verb.text("FILE", a.file, "The configuration; \"-\", or none, for standard input");
 }
 
-void addRemoveInstanceOptions(CLI::App& verb, Arguments& a) {
+void addRemoveInstanceOptions(Verb& verb, Arguments& a) {
   takesProduct(verb, a);
-  verb.add_option("INSTANCE", a.target, "The instance to remove")->type_name("")->required()->check(notEmpty);
-  verb.add_option("--config", a.file, "A file for the translator to read; \"-\" for standard input")
-      ->type_name("FILE")
-      ->check(notEmpty);
+  verb.text("INSTANCE", a.target, "The instance to remove").required();
+  verb.text("--config FILE", a.file, "A file for the translator to read; \"-\" for standard input");
 }
 
-void addDaConfigOptions(CLI::App& verb, Arguments& a) {
+void addDaConfigOptions(Verb& verb, Arguments& a) {
   takesTarget(verb, a, "Managed system name of the data agent, such as inst1:node1:DA");
-  verb.add_option("--model", a.model, "Model file, relative to the depot")->type_name("FILE")->check(notEmpty);
-  verb.add_option("--script", a.scripts, "Script file, relative to the depot; may be given several times")
-      ->type_name("FILE")
-      ->check(notEmpty);
-  verb.add_option("--port", a.port, "Port of the agent's console")->type_name("PORT")->check(CLI::Range(1, 65535));
+  verb.text("--model FILE", a.model, "Model file, relative to the depot");
+  verb.texts("--script FILE", a.scripts, "Script file, relative to the depot; may be given several times")
+      .check([](const std::string& name) {
+        return name.find(',') == std::string::npos ? "" : "must not hold a comma, which would make two names of it";
+      });
+  verb.number("--port PORT", a.port, {1, 65535}, "Port of the agent's console");
 }
 
-void addNoOptions(CLI::App&, Arguments&) {}
+void addNoOptions(Verb&, Arguments&) {}
 
 // ---- requests ------------------------------------------------------------------------------------------------------
 
@@ -88,6 +89,14 @@ void buildInstall(Request& request, const Arguments& a) {
 void buildUninstall(Request& request, const Arguments& a) {
   addParameter(request, "VERSION", a.version);
   addParameter(request, "CONTEXT", a.installer);
+  if (!a.installer.empty()) return;
+  request.explains = [product = a.product](const Result& result) {
+    constexpr long notStarted = 1033;
+    // It had no command line to run.
+    return result.returnValue != notStarted || !result.parameters.empty()
+               ? ""
+               : "The inventory does not list " + product + "; say with --command what installed it.";
+  };
 }
 
 void buildGetConfig(Request& request, const Arguments& a) {
@@ -97,8 +106,11 @@ void buildGetConfig(Request& request, const Arguments& a) {
     if (configuration.empty()) console.line("There is no configuration.");
     const bool ended = configuration.empty() || configuration.back() == '\n';
     console.data(linesText(ended ? configuration : configuration + "\n", console.out()));
-    if (configuration.size() >= contextColumnBytes)
-      console.line("The configuration fills its column and may go on: what an answer holds ends here.");
+  };
+  request.doubts = [](const Json& answer) {
+    return textIn(answer, "CONTEXT").size() < contextColumnBytes
+               ? ""
+               : "The configuration fills its column and may go on: what an answer holds ends here.";
   };
 }
 
@@ -120,7 +132,7 @@ void buildDaConfig(Request& request, const Arguments& a) {
   addParameter(request, "TARGETMSN", a.target);
   addParameter(request, "DACONFIG", a.model);
   addParameter(request, "DASCRIPT", joined(a.scripts));
-  if (a.port != 0) addParameter(request, "CONTEXT", "PORT=" + std::to_string(a.port));
+  if (a.port) addParameter(request, "CONTEXT", "PORT=" + std::to_string(*a.port));
 }
 
 void buildNothing(Request&, const Arguments&) {}
@@ -133,7 +145,7 @@ struct ProductVerb {
   const char* product;  ///< null: typed
   Request::Outcome outcome;
   unsigned timeoutSeconds;
-  void (*addOptions)(CLI::App&, Arguments&);
+  void (*addOptions)(Verb&, Arguments&);
   void (*build)(Request&, const Arguments&);
   const char* description;
   const char* example;
@@ -173,22 +185,20 @@ constexpr ProductVerb productVerbs[] = {
 
 }  // namespace
 
-void addProductVerbs(CLI::App& app, Invocation& invocation) {
-  for (const ProductVerb& verb : productVerbs) {
+void addProductVerbs(Verbs& verbs) {
+  for (const ProductVerb& each : productVerbs) {
     const auto arguments = std::make_shared<Arguments>();
-    CLI::App* const sub = app.add_subcommand(verb.name, verb.description);
-    verb.addOptions(*sub, *arguments);
-    addRequestOptions(*sub, arguments->request, verb.outcome);
-    addCommonOptions(*sub, invocation, verb.timeoutSeconds);
-    sub->footer(std::string("Examples:\n") + verb.example);
-    sub->callback([&invocation, &verb, arguments] {
+    Verb verb = verbs.add(each.name, each.description, each.timeoutSeconds, [&each, arguments] {
       Request request;
-      request.command = verb.command;
-      request.outcome = verb.outcome;
-      addParameter(request, "PRODUCT", verb.product != nullptr ? verb.product : arguments->product);
-      verb.build(request, *arguments);
-      invocation.action = requestAction(request, arguments->request, verb.timeoutSeconds);
+      request.command = each.command;
+      request.outcome = each.outcome;
+      addParameter(request, "PRODUCT", each.product != nullptr ? each.product : arguments->product);
+      each.build(request, *arguments);
+      return requestAction(request, arguments->request);
     });
+    each.addOptions(verb, *arguments);
+    addRequestOptions(verb, arguments->request, each.outcome);
+    verb.footer(std::string("Examples:\n") + each.example);
   }
 }
 

@@ -7,6 +7,7 @@
 
 #include "apps/vmqctl/commands/install_request.h"
 #include "apps/vmqctl/commands/request_options.h"
+#include "apps/vmqctl/commands/verbs.h"
 #include "apps/vmqctl/failure.h"
 #include "apps/vmqctl/push/pusher.h"
 #include "apps/vmqctl/transaction_id.h"
@@ -123,26 +124,33 @@ InstallArguments withInstaller(InstallArguments install, const std::string& bund
   return install;
 }
 
+/// The folder of the depot is a word of command lines.
+std::string blanksIn(const std::string& value) {
+  return value.find_first_of(" \t\n") == std::string::npos ? ""
+                                                           : "must not hold blanks, at which command lines are split";
+}
+
 ExitCode runDeploy(Session& session, const DeployArguments& arguments) {
   PushPlan plan;
   plan.addContents(arguments.bundle, deployFolder(arguments.install));
   plan.check();
   const Request request = installRequest(withInstaller(arguments.install, arguments.bundle));
+  const std::string id = transactionIdFor(arguments.request);
+  checkSendable(predicatesOf(request, id));
   tellEmptyFolders(session, plan);
   if (arguments.request.dryRun) {
     session.console.line(notSentLine());
     if (session.format == Format::AsTable) {
       showFiles(session, plan);
-      return requestAction(request, arguments.request, installationTimeoutSeconds).run(session);
+      return requestAction(request, arguments.request)(session);
     }
-    const std::string id = transactionIdFor(arguments.request);
     session.console.data(
         jsonText({{"files", plannedFiles(plan)}, {"request", {{"predicates", toJson(predicatesOf(request, id))}}}},
                  /*oneLine=*/false, session.console.out()));
     return ExitCode::Done;
   }
 
-  RequestOptions options = {transactionIdFor(arguments.request), !arguments.request.noWait};
+  RequestOptions options = {id, !arguments.request.noWait};
   {
     Pusher pusher(session, plan, arguments.verify);
     try {
@@ -160,52 +168,38 @@ ExitCode runDeploy(Session& session, const DeployArguments& arguments) {
 
 }  // namespace
 
-void addPush(CLI::App& app, Invocation& invocation) {
+void addPush(Verbs& verbs) {
   const auto arguments = std::make_shared<PushArguments>();
-  CLI::App* const sub = app.add_subcommand("push", "Send files and folders to the depot.");
-  sub->add_option("FILE|DIR", arguments->sources, "What to send; a folder with everything in it, under its own name")
-      ->type_name("")
-      ->required()
-      ->check(notEmpty);
-  sub->add_option("--to", arguments->folder, "The folder in the depot to put it in (default: the depot itself)")
-      ->type_name("PATH")
-      ->check(notEmpty);
-  sub->add_flag("--verify", arguments->verify, "Compare size and SHA-256 of each file with what has arrived");
-  sub->add_flag("--dry-run", arguments->dryRun, "Show what would be sent, and send nothing");
-  addCommonOptions(*sub, invocation, pushTimeoutSeconds);
-  sub->footer(
+  Verb verb = verbs.add("push", "Send files and folders to the depot.", pushTimeoutSeconds,
+                        [arguments] { return [arguments](Session& session) { return runPush(session, *arguments); }; });
+  verb.texts("FILE|DIR", arguments->sources, "What to send; a folder with everything in it, under its own name")
+      .required();
+  verb.text("--to PATH", arguments->folder, "The folder in the depot to put it in (default: the depot itself)");
+  verb.flag("--verify", arguments->verify, "Compare size and SHA-256 of each file with what has arrived");
+  verb.flag("--dry-run", arguments->dryRun, "Show what would be sent, and send nothing");
+  verb.footer(
       "Examples:\n"
       "  vmqctl push bundles/ux\n"
       "  vmqctl push sales.mdl read_sales.sh --to models --verify");
-  sub->callback([&invocation, arguments] {
-    invocation.action = {pushTimeoutSeconds,
-                         [arguments = *arguments](Session& session) { return runPush(session, arguments); }};
-  });
 }
 
-void addDeploy(CLI::App& app, Invocation& invocation) {
+void addDeploy(Verbs& verbs) {
   const auto arguments = std::make_shared<DeployArguments>();
-  CLI::App* const sub = app.add_subcommand("deploy", "Send the files of a product to the depot and install it.");
-  sub->add_option("BUNDLE_DIR", arguments->bundle, "The folder with the files of this version of the product")
-      ->type_name("")
-      ->required()
-      ->check(notEmpty);
-  takesProduct(*sub, arguments->install);
-  takesVersion(*sub, arguments->install, /*required=*/true);
-  takesCommand(*sub, arguments->install, /*required=*/false,
-               (std::string("The installer's command line (default: ") + defaultInstaller + ")").c_str());
-  takesInstallSteps(*sub, arguments->install);
-  sub->add_flag("--verify", arguments->verify, "Compare size and SHA-256 of each file with what has arrived");
-  addRequestOptions(*sub, arguments->request, Request::Outcome::Queued);
-  addCommonOptions(*sub, invocation, installationTimeoutSeconds);
-  sub->footer(
+  Verb verb =
+      verbs.add("deploy", "Send the files of a product to the depot and install it.", installationTimeoutSeconds,
+                [arguments] { return [arguments](Session& session) { return runDeploy(session, *arguments); }; });
+  verb.text("BUNDLE_DIR", arguments->bundle, "The folder with the files of this version of the product").required();
+  takesProduct(verb, arguments->install).check(blanksIn);
+  takesVersion(verb, arguments->install).required().check(blanksIn);
+  takesCommand(verb, arguments->install,
+               std::string("The installer's command line (default: ") + defaultInstaller + ")");
+  takesInstallSteps(verb, arguments->install);
+  verb.flag("--verify", arguments->verify, "Compare size and SHA-256 of each file with what has arrived");
+  addRequestOptions(verb, arguments->request, Request::Outcome::Queued);
+  verb.footer(
       "Examples:\n"
       "  vmqctl deploy bundles/ux/06.20 ux --version 06.20\n"
       "  vmqctl deploy ./ux ux --version 06.20 --verify --command '|DEPLOYDIR|/setup -q'");
-  sub->callback([&invocation, arguments] {
-    invocation.action = {installationTimeoutSeconds,
-                         [arguments = *arguments](Session& session) { return runDeploy(session, arguments); }};
-  });
 }
 
 }  // namespace vmqctl

@@ -35,29 +35,26 @@ ExitCode run(Session& session, const std::string& tableName, const Predicates& p
 
 }  // namespace
 
-void addQuery(CLI::App& app, Invocation& invocation) {
+void addQuery(Verbs& verbs) {
   const auto arguments = std::make_shared<Arguments>();
-  CLI::App* sub = app.add_subcommand("query", "Show the rows of a table. With KAGREQT this runs the command it names.");
-  sub->add_option("TABLE", arguments->table, "KAGREQT, KINAGT or KAGDYST (vmqctl status lists them)")
-      ->type_name("")
-      ->required()
-      ->check(notEmpty);
-  sub->add_option("COLUMN=VALUE", arguments->predicates, "Only rows like this; also with !=, <, <=, >, >= (quote them)")
-      ->type_name("");
-  addCommonOptions(*sub, invocation, defaultTimeoutSeconds);
-  sub->footer(
+  Verb verb = verbs.add("query", "Show the rows of a table. With KAGREQT this runs the command it names.",
+                        defaultTimeoutSeconds, [arguments] {
+                          Predicates predicates;
+                          for (const std::string& text : arguments->predicates) {
+                            predicates.push_back(parsePredicate(text));
+                          }
+                          checkSendable(predicates);
+                          return [name = arguments->table, predicates](Session& session) {
+                            return run(session, name, predicates);
+                          };
+                        });
+  verb.text("TABLE", arguments->table, "KAGREQT, KINAGT or KAGDYST (vmqctl status lists them)").required();
+  verb.texts("COLUMN=VALUE", arguments->predicates, "Only rows like this; also with !=, <, <=, >, >= (quote them)");
+  verb.footer(
       "Examples:\n"
       "  vmqctl query KINAGT\n"
       "  vmqctl query KAGREQT COMMAND=GETCONFIG TRANSID=t1 PRODUCT=ux -o json\n"
       "  vmqctl query KAGREQT COMMAND=STOP TRANSID=t2 PRODUCT=ux 'RETVAL!=0'");
-  sub->callback([&invocation, arguments] {
-    Predicates predicates;
-    for (const std::string& text : arguments->predicates) predicates.push_back(parsePredicate(text));
-    (void)toJson(predicates);  // refuses a column given twice, before anything is connected
-    invocation.action = {defaultTimeoutSeconds, [name = arguments->table, predicates](Session& session) {
-                           return run(session, name, predicates);
-                         }};
-  });
 }
 
 }  // namespace vmqctl

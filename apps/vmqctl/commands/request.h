@@ -4,6 +4,7 @@
 #include <functional>
 #include <string>
 
+#include "apps/vmqctl/commands/result.h"
 #include "apps/vmqctl/settings.h"
 
 namespace vmqctl {
@@ -19,6 +20,10 @@ struct Request {
   Outcome outcome = Outcome::Queued;
   /// Shows the answer row of a success in place of the table; for commands whose answer is what was asked for.
   std::function<void(const Console& console, const Json& answer)> shows = {};
+  /// A line for the person about the answer row of a success, "" for none.
+  std::function<std::string(const Json& answer)> doubts = {};
+  /// What more there is to say of a failure, "" for nothing.
+  std::function<std::string(const Result& failure)> explains = {};
   std::string afterSuccess = {};  ///< a line for the person when the command has succeeded
 };
 

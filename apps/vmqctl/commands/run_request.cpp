@@ -40,7 +40,11 @@ std::string quoted(const std::string& word) {
   return result + "'";
 }
 
-std::string watchHint(const Session& session, const std::string& transactionId) {
+/// How the outcome can be learnt when waiting for it has ended.
+std::string outcomeHint(const Session& session, const Request& request, const std::string& transactionId) {
+  if (request.outcome == Request::Outcome::AtOnce) {  // without an event; asking once more changes nothing
+    return session.loop.expired() ? "Ask again, with a longer --timeout." : "Ask again.";
+  }
   const std::string socket = session.loop.socket();
   return "Watch for its status event with: vmqctl watch " +
          (socket == defaultSocket ? "" : "--socket " + quoted(socket) + " ") + quoted(transactionId) +
@@ -154,8 +158,8 @@ std::string parameter(const Request& request, const std::string& column) {
 
 ExitCode runRequest(Session& session, const Request& request, const RequestOptions& options) {
   const std::string words = inWords(request);
-  const std::string hint = watchHint(session, options.transactionId);
-  const std::string seconds = std::to_string(session.timeoutSeconds) + " seconds";
+  const auto hint = [&] { return outcomeHint(session, request, options.transactionId); };
+  const std::string seconds = counted(session.timeoutSeconds, "second");
   Phase phase = Phase::Opening;
   Report report;
   try {
@@ -167,7 +171,7 @@ ExitCode runRequest(Session& session, const Request& request, const RequestOptio
     throw Failure(ExitCode::Interrupted,
                   phase == Phase::Sent ? "Interrupted; if the daemon has taken " + words + ", it goes on with it."
                                        : "Interrupted; the daemon goes on with " + words + ".",
-                  hint);
+                  hint());
   } catch (const TimedOut&) {
     if (phase == Phase::Opening) {
       throw Failure(ExitCode::TimedOut,
@@ -178,23 +182,28 @@ ExitCode runRequest(Session& session, const Request& request, const RequestOptio
                   phase == Phase::Sent
                       ? "The daemon did not answer " + words + " within " + seconds + "; it may have taken it."
                       : "No status event of " + words + " came within " + seconds + "; the daemon goes on with it.",
-                  hint);
+                  hint());
   } catch (const AnswerLost& lost) {
-    throw Failure(lost.code(), std::string(lost.what()) + " It may have taken " + words + " all the same.", hint);
+    throw Failure(lost.code(), std::string(lost.what()) + " It may have taken " + words + " all the same.", hint());
   }
 
   session.progress.clear();
-  if (report.details.returnValue == 0 && request.shows && session.format == Format::AsTable) {
+  const bool failed = report.details.returnValue != 0;
+  if (!failed && request.shows && session.format == Format::AsTable) {
     request.shows(session.console, report.answer);
   } else {
     write(session, request, options, report);
   }
   const std::string details = explanation(report.details);
-  if (report.details.returnValue != 0) {
+  if (failed) {
+    const std::string more = request.explains ? request.explains(report.details) : "";
     session.console.error(
         words + (report.result == std::string_view("refused") ? " was refused: " : " failed: ") + details,
-        outputHint(request, report.details.returnValue));
+        more.empty() ? outputHint(request, report.details.returnValue) : more);
     return ExitCode::Failed;
+  }
+  if (const std::string doubt = request.doubts ? request.doubts(report.answer) : ""; !doubt.empty()) {
+    session.console.line(doubt);
   }
   // A restart whose stop failed and whose start succeeded is a success that carries the stop's message.
   if (!details.empty())

@@ -57,11 +57,10 @@ ExitCode run(Session& session) {
 
 }  // namespace
 
-void addStatus(CLI::App& app, Invocation& invocation) {
-  CLI::App* sub = app.add_subcommand("status", "Show whether the daemon is well, and what it serves.");
-  addCommonOptions(*sub, invocation, defaultTimeoutSeconds);
-  sub->footer("Example:\n  vmqctl status -o json");
-  sub->callback([&invocation] { invocation.action = {defaultTimeoutSeconds, run}; });
+void addStatus(Verbs& verbs) {
+  Verb verb = verbs.add("status", "Show whether the daemon is well, and what it serves.", defaultTimeoutSeconds,
+                        [] { return run; });
+  verb.footer("Example:\n  vmqctl status -o json");
 }
 
 }  // namespace vmqctl

@@ -1,31 +1,55 @@
 #pragma once
-// The verbs of the command line. Each routine adds its own, and sets `action` when one of them was typed.
+// The verbs of the command line. Each routine adds its own.
 
-#include <CLI/CLI.hpp>
+#include <algorithm>
+#include <functional>
+#include <string>
+#include <vector>
 
+#include "apps/vmqctl/command_line.h"
 #include "apps/vmqctl/settings.h"
 
 namespace vmqctl {
 
-/// What verbs fill in while the command line is read. Must stay where it is.
-struct Invocation {
-  Settings settings;
-  Action action;
+struct DeclaredVerb {
+  std::string name;
+  Verb verb;
+  unsigned defaultTimeoutSeconds;  ///< 0 for no limit
+  /// Called when the command line has been read: returns what is to be done, or throws a Failure of usage before
+  /// anything is connected.
+  std::function<Action()> prepare;
 };
 
-void addAgentVerbs(CLI::App& app, Invocation& invocation);    ///< start, stop, restart
-void addProductVerbs(CLI::App& app, Invocation& invocation);  ///< install to set-da-config
-void addPush(CLI::App& app, Invocation& invocation);
-void addDeploy(CLI::App& app, Invocation& invocation);
-void addInventory(CLI::App& app, Invocation& invocation);
-void addQuery(CLI::App& app, Invocation& invocation);
-void addWatch(CLI::App& app, Invocation& invocation);
-void addStatus(CLI::App& app, Invocation& invocation);
+/// Every verb that there is, in the order of the help.
+class Verbs {
+ public:
+  explicit Verbs(CommandLine& line) : line_(line) {}
 
-/// --socket and -o, and --timeout with this default (seconds; 0 for no limit).
-void addCommonOptions(CLI::App& verb, Invocation& invocation, unsigned defaultTimeoutSeconds);
+  Verb add(const std::string& name, const std::string& description, unsigned defaultTimeoutSeconds,
+           std::function<Action()> prepare) {
+    all_.push_back({name, line_.verb(name, description), defaultTimeoutSeconds, std::move(prepare)});
+    return all_.back().verb;
+  }
 
-/// For options where an empty text, say of a variable that was not set, would mean something else than was meant.
-extern const CLI::Validator notEmpty;
+  std::vector<DeclaredVerb>& all() { return all_; }
+
+  /// REQUIRES: there is one.
+  [[nodiscard]] const DeclaredVerb& named(const std::string& name) const {
+    return *std::find_if(all_.begin(), all_.end(), [&](const DeclaredVerb& each) { return each.name == name; });
+  }
+
+ private:
+  CommandLine& line_;
+  std::vector<DeclaredVerb> all_;
+};
+
+void addAgentVerbs(Verbs& verbs);    ///< start, stop, restart
+void addProductVerbs(Verbs& verbs);  ///< install to set-da-config
+void addPush(Verbs& verbs);
+void addDeploy(Verbs& verbs);
+void addInventory(Verbs& verbs);
+void addQuery(Verbs& verbs);
+void addWatch(Verbs& verbs);
+void addStatus(Verbs& verbs);
 
 }  // namespace vmqctl

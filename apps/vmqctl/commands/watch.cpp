@@ -2,6 +2,7 @@
 
 #include <climits>
 #include <memory>
+#include <optional>
 
 #include "apps/vmqctl/commands/result.h"
 #include "apps/vmqctl/commands/verbs.h"
@@ -12,7 +13,7 @@ namespace {
 
 struct Arguments {
   std::string transactionId;
-  unsigned count = 0;  ///< 0 for no limit
+  std::optional<unsigned> count;
 };
 
 /// "t1: START of inst1:node1:UX on node1 failed: VMQ1024E The agent control script ..."
@@ -32,14 +33,17 @@ void show(const Session& session, const Json& row) {
                                                         : escaped(inWords(row), out.charset) + "\n");
 }
 
+Predicates filterOf(const Arguments& arguments) {
+  if (arguments.transactionId.empty()) return {};
+  return {{"TRANSID", "eq", arguments.transactionId}};
+}
+
 /// Returns once `count` events have come; throws else.
 void watch(Session& session, const Arguments& arguments) {
-  Predicates filter;
-  if (!arguments.transactionId.empty()) filter.push_back({"TRANSID", "eq", arguments.transactionId});
-  EventStream events(session.loop, "KAGDYST", filter);
+  EventStream events(session.loop, "KAGDYST", filterOf(arguments));
   session.progress.tell("watching for status events" +
                         (arguments.transactionId.empty() ? "" : " of " + arguments.transactionId) + ", Ctrl-C ends");
-  for (unsigned seen = 0; arguments.count == 0 || seen < arguments.count;) {
+  for (unsigned seen = 0; !arguments.count || seen < *arguments.count;) {
     const StreamEvent event = events.next();
     session.progress.clear();
     switch (event.kind) {
@@ -66,31 +70,27 @@ ExitCode run(Session& session, const Arguments& arguments) {
     // The way to end it.
   } catch (const TimedOut&) {
     throw Failure(ExitCode::TimedOut,
-                  "The " + std::to_string(session.timeoutSeconds) + " seconds of --timeout are over.");
+                  "The time of --timeout, " + counted(session.timeoutSeconds, "second") + ", is over.");
   }
   return ExitCode::Done;
 }
 
 }  // namespace
 
-void addWatch(CLI::App& app, Invocation& invocation) {
+void addWatch(Verbs& verbs) {
   const auto arguments = std::make_shared<Arguments>();
-  CLI::App* sub = app.add_subcommand("watch", "Show status events, a line each, as they come. Ctrl-C ends it.");
-  sub->add_option("TRANSID", arguments->transactionId, "Only those of the request with this transaction id")
-      ->type_name("")
-      ->check(notEmpty);
-  sub->add_option("--count", arguments->count, "End after this many events")
-      ->type_name("N")
-      ->check(CLI::Range(1U, UINT_MAX).description(""));
-  addCommonOptions(*sub, invocation, /*defaultTimeoutSeconds=*/0);
-  sub->footer(
+  Verb verb = verbs.add("watch", "Show status events, a line each, as they come. Ctrl-C ends it.",
+                        /*defaultTimeoutSeconds=*/0, [arguments] {
+                          checkSendable(filterOf(*arguments));
+                          return [arguments](Session& session) { return run(session, *arguments); };
+                        });
+  verb.text("TRANSID", arguments->transactionId, "Only those of the request with this transaction id");
+  verb.number("--count N", arguments->count, {1, UINT_MAX}, "End after this many events");
+  verb.footer(
       "Events sent before it listens are not repeated.\n"
       "Examples:\n"
       "  vmqctl watch\n"
       "  vmqctl watch t1 --count 1 --timeout 60");
-  sub->callback([&invocation, arguments] {
-    invocation.action = {0, [arguments = *arguments](Session& session) { return run(session, arguments); }};
-  });
 }
 
 }  // namespace vmqctl

@@ -160,6 +160,15 @@ void PushPlan::check() const {
     const auto [other, isNew] = byName.emplace(file.name, &file);
     if (!isNew) refuse(other->second->source + " and " + file.source + " would both become " + file.name + ".");
   }
+  for (const PlannedFile& file : files_) {
+    const std::string_view name = file.name;
+    for (std::size_t end = name.find('/'); end != std::string_view::npos; end = name.find('/', end + 1)) {
+      const auto other = byName.find(name.substr(0, end));
+      if (other == byName.end()) continue;
+      refuse(other->second->source + " would become the file " + other->second->name + ", and " + file.source +
+             " would be in a folder of that name.");
+    }
+  }
 }
 
 void PushPlan::checkFits(const std::string& depot, std::size_t chunkBytes) const {

@@ -27,7 +27,8 @@ class PushPlan {
   /// Adds everything in a folder, under the names that it has there, in a folder of the depot.
   void addContents(const std::string& directory, const std::string& folder);
 
-  /// Throws when there is nothing to send, or when two files have one name in the depot.
+  /// Throws when there is nothing to send, when two files have one name in the depot, or a file
+  /// has that of a folder.
   void check() const;
 
   /// Throws when a path under this depot (ending with "/") is too long, or a file has more chunks than can be numbered.

@@ -52,10 +52,6 @@ std::uint32_t statusIn(const RpcReply& reply) {
   return status;
 }
 
-std::string counted(std::size_t count, const char* what) {
-  return std::to_string(count) + " " + what + (count == 1 ? "" : "s");
-}
-
 }  // namespace
 
 Pusher::Pusher(Session& session, const PushPlan& plan, bool verify)
@@ -105,7 +101,7 @@ void Pusher::run() {
     throw Failure(ExitCode::Interrupted, "Interrupted at " + where() + ". " + whatIsLeft(), againHint);
   } catch (const TimedOut&) {
     throw Failure(ExitCode::TimedOut,
-                  "The " + std::to_string(session_.timeoutSeconds) + " seconds of --timeout were over at " + where() +
+                  "The time of --timeout, " + counted(session_.timeoutSeconds, "second") + ", was over at " + where() +
                       ". " + whatIsLeft(),
                   std::string("Allow it more with --timeout. ") + againHint);
   } catch (const Failure& failure) {
@@ -222,7 +218,8 @@ TransferState Pusher::state() const {
           sent_.size() + (ended ? 0 : 1),
           plan_.files().size(),
           ended ? plan_.files().back().name : current().name,
-          std::chrono::steady_clock::now() - begun_};
+          std::chrono::steady_clock::now() - begun_,
+          !ended && stage_ == Stage::Verifying};
 }
 
 Json Pusher::report() const {

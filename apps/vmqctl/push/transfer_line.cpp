@@ -43,6 +43,8 @@ std::string inBytes(std::uint64_t bytes) {
 }
 
 std::string transferLine(const TransferState& state) {
+  const std::string count = "file " + std::to_string(state.fileNumber) + " of " + std::to_string(state.files);
+  if (state.verifying) return "verifying " + state.name + ", " + count;
   const double part = partDone(state);
   const auto filled = static_cast<std::size_t>(part * barColumns);
   char percent[16];
@@ -54,7 +56,7 @@ std::string transferLine(const TransferState& state) {
     const double left = static_cast<double>(state.bytesTotal - std::min(state.bytesTotal, state.bytesDone)) / rate;
     line += ", " + inBytes(static_cast<std::uint64_t>(rate)) + "/s, " + clockTime(left) + " left";
   }
-  return line + ", file " + std::to_string(state.fileNumber) + " of " + std::to_string(state.files) + ": " + state.name;
+  return line + ", " + count + ": " + state.name;
 }
 
 }  // namespace vmqctl

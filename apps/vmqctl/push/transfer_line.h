@@ -15,9 +15,11 @@ struct TransferState {
   std::size_t files = 1;
   std::string name;  ///< of that file
   std::chrono::duration<double> lasted{};
+  bool verifying = false;  ///< that file has been sent, and is being compared with what has arrived
 };
 
-/// " 45 % [#########-----------] 1.2 GiB of 2.7 GiB, 310 MiB/s, 0:05 left, file 3 of 12: ux/a.bin". Not escaped.
+/// " 45 % [#########-----------] 1.2 GiB of 2.7 GiB, 310 MiB/s, 0:05 left, file 3 of 12: ux/a.bin",
+/// "verifying ux/a.bin, file 3 of 12". Not escaped.
 std::string transferLine(const TransferState& state);
 
 /// "0 bytes", "1 byte", "1023 bytes", "1.5 KiB", "12 MiB": two digits at least, no more than are worth reading.
