@@ -52,11 +52,14 @@ fetch_exporter() {
   [ -x "$exporter" ] && return
   echo "unpacking prometheus-node-exporter into $1"
   mkdir -p "$1" || return
-  download_exporter "$1" || { update_once && download_exporter "$1"; } || return
+  download_exporter "$1" 2>/dev/null || { update_once && download_exporter "$1"; } || {
+    echo "prometheus-node-exporter, the agent, cannot be downloaded" >&2
+    return 1
+  }
   dpkg-deb -x "$1"/prometheus-node-exporter_*.deb "$1" && rm -f "$1"/prometheus-node-exporter_*.deb
 }
 
 download_exporter() {
   # As root, apt would fetch as a user of its own, who may not write here.
-  (cd "$1" && apt-get -qq -o APT::Sandbox::User="$(id -un)" download prometheus-node-exporter >/dev/null 2>&1)
+  (cd "$1" && apt-get -qq -o APT::Sandbox::User="$(id -un)" download prometheus-node-exporter >/dev/null)
 }

@@ -48,6 +48,13 @@ TEST_F(Products, InstalledAgentIsListedAndRunsFromItsOwnProgram) {
             home / "zlpqor6/lx8266/ux/bin/prometheus-node-exporter");
 }
 
+TEST_F(Products, RemovalOfWhatTheInventoryDoesNotListNeedsACommand) {
+  const Outcome outcome = vmqctl("uninstall zz");
+  EXPECT_EQ(outcome.exit_code, 1);
+  EXPECT_THAT(outcome.output,
+              testing::EndsWith("The inventory does not list zz; say with --command what installed it.\n"));
+}
+
 TEST_F(Products, InstallRegistersTheProductWhenToldTo) {
   EXPECT_EQ(vmqctl(installBundle).exit_code, 0);
   EXPECT_FALSE(fs::exists(home / "registry/rms.tbl"));

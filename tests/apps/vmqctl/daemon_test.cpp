@@ -136,7 +136,7 @@ TEST_F(DaemonTest, SlowAgentRunsIntoTheTimeOut) {
   home_.hold();
   const VmqctlResult result = run({"start", "slow", "--timeout", "1"});
   EXPECT_EQ(result.code, 6);
-  EXPECT_THAT(result.err, HasSubstr("vmqctl: No status event of START of slow came within 1 seconds"));
+  EXPECT_THAT(result.err, HasSubstr("vmqctl: No status event of START of slow came within 1 second"));
 }
 
 TEST_F(DaemonTest, DaemonThatGoesAwayIsTold) {

@@ -93,6 +93,13 @@ TEST_F(ProductVerbs, SendTheirParameters) {
   EXPECT_EQ(sentBy({"complete-install", "--transid", "t1"}), body("COMPLETE_INSTALL", ""));
 }
 
+// The parser of the command line takes brackets for lists.
+TEST_F(ProductVerbs, NamesInBracketsAreNames) {
+  EXPECT_EQ(sentBy({"set-da-config", "--model", "[m]", "--script", "[ab]", "--script=[c d]", "--script", "{}",
+                    "--transid", "t1", "--no-wait"}),
+            body("SETCONFIG", R"(,"PRODUCT":"um","DACONFIG":"[m]","DASCRIPT":"[ab],[c d],{}")"));
+}
+
 TEST_F(ProductVerbs, DryRunShowsTheRequestAndSendsNothing) {
   const VmqctlResult result = run({"uninstall", "ux", "--transid", "t1", "--dry-run"});
   EXPECT_EQ(result.code, 0);
@@ -125,6 +132,42 @@ TEST_F(ProductVerbs, ConfigurationThatFillsItsColumnIsDoubted) {
   EXPECT_EQ(result.out, std::string(3072, 'x') + "\n");
   EXPECT_THAT(result.err,
               EndsWith("The configuration fills its column and may go on: what an answer holds ends here.\n"));
+  EXPECT_THAT(run({"get-config", "ux", "-o", "json"}).err,
+              EndsWith("The configuration fills its column and may go on: what an answer holds ends here.\n"));
+}
+
+TEST_F(ProductVerbs, ConfigurationThatFitsItsColumnIsNotDoubted) {
+  configurationIs(std::string(3071, 'x'));
+  for (const char* format : {"table", "json"}) {
+    EXPECT_THAT(run({"get-config", "ux", "-o", format}).err, testing::Not(HasSubstr("may go on"))) << format;
+  }
+}
+
+// They send no status event that could be watched for.
+TEST_F(ProductVerbs, WhatRunsAtOnceIsAskedForAgainWhenItWasNotAnswered) {
+  daemon_.on(commandRequest, [](Exchange& exchange) { exchange.awaitClose(); });
+  VmqctlResult result = run({"get-config", "ux", "--timeout", "1"});
+  EXPECT_EQ(result.code, 6);
+  EXPECT_THAT(result.err,
+              EndsWith("The daemon did not answer GETCONFIG of ux within 1 second; it may have taken it. Ask "
+                       "again, with a longer --timeout.\n"));
+  daemon_.on(commandRequest, [](Exchange&) {});
+  result = run({"complete-install"});
+  EXPECT_EQ(result.code, 7);
+  EXPECT_THAT(result.err, EndsWith("It may have taken COMPLETE_INSTALL all the same. Ask again.\n"));
+}
+
+TEST_F(ProductVerbs, ProductThatTheInventoryDoesNotListIsTold) {
+  const std::string told = "The inventory does not list zz; say with --command what installed it.\n";
+  const std::string row = statusRow("t1", "UNINSTALL", 1033, "VMQ1033E");
+  Gate asked;
+  endRequestsWith(daemon_, asked, row);
+  const VmqctlResult result = run({"uninstall", "zz", "--transid", "t1"});
+  EXPECT_EQ(result.code, 1);
+  EXPECT_THAT(result.err, EndsWith(told));
+  EXPECT_THAT(run({"uninstall", "zz", "--transid", "t1", "--command", "u"}).err, testing::Not(HasSubstr(told)));
+  endRequestsWith(daemon_, asked, statusRow("t1", "UNINSTALL", 1033, "VMQ1033E", "/h/bin/uninstall.sh -i zz lx8266"));
+  EXPECT_THAT(run({"uninstall", "zz", "--transid", "t1"}).err, testing::Not(HasSubstr(told)));
 }
 
 TEST_F(ProductVerbs, FailureSaysWhereTheOutputIs) {
@@ -180,7 +223,7 @@ TEST_F(ProductVerbs, MistakesAreToldAndNothingIsSent) {
        directory_ / "zero holds a zero byte, so it is no text."},
       {{"set-da-config"}, "There is nothing to configure: name a --model or a --script."},
       {{"set-da-config", "--model", "m", "--port", "0"},
-       "--port: Value 0 not in range 1 to 65535. See vmqctl set-da-config --help."},
+       "--port: must be a whole number from 1 to 65535. See vmqctl set-da-config --help."},
       {{"remove-instance", "ux"}, "INSTANCE is required. See vmqctl remove-instance --help."},
   };
   for (const auto& [arguments, error] : cases) {

@@ -217,6 +217,19 @@ TEST_F(Push, HomeIsTheDepotWhenNoneIsConfigured) {
   EXPECT_THAT(run({"push", directory_.writeFile("a", "")}).out, EndsWith("/home/\n"));
 }
 
+// The parser of the command line takes brackets for lists.
+TEST_F(Push, NamesInBracketsAreNames) {
+  directory_.writeFile("ab", "");
+  directory_.writeFile("[ab]", "");
+  std::filesystem::create_directory(directory_ / "[");
+  directory_.writeFile("[/a b]", "");
+  VmqctlOptions options;
+  options.program =
+      directory_.writeScript("in-folder", "cd '" + directory_.path().string() + "' && exec " VMQCTL_PROGRAM " \"$@\"");
+  EXPECT_EQ(run({"push", "[ab]", "[/a b]"}, options).code, 0);
+  EXPECT_THAT(labels(), ElementsAre("[ab]#1", "a b]#1"));
+}
+
 TEST_F(Push, DryRunSendsNothing) {
   directory_.writeFile("ux/a", "123");
   const VmqctlResult result = run({"push", directory_ / "ux", "--dry-run"});
@@ -422,10 +435,11 @@ TEST_F(Push, LargePacketIsNotSentTwiceEither) {
 
 TEST_F(Push, AnswerThatDoesNotComeEndsWithTheTime) {
   answerPacket(2, [](Exchange& exchange) { exchange.awaitClose(); });
-  expectFailure(run({"push", directory_.writeFile("a", std::string(3 * 8192, 'a')), "--timeout", "1"}), 6,
-                "The 1 seconds of --timeout were over at a, chunk 2 of 3. The file is incomplete on the machine. Allow "
-                "it more with --timeout." +
-                    again);
+  expectFailure(
+      run({"push", directory_.writeFile("a", std::string(3 * 8192, 'a')), "--timeout", "1"}), 6,
+      "The time of --timeout, 1 second, was over at a, chunk 2 of 3. The file is incomplete on the machine. Allow "
+      "it more with --timeout." +
+          again);
 }
 
 TEST_F(Push, CtrlCSaysWhatIsLeft) {
@@ -674,6 +688,22 @@ TEST_F(Deploy, MustStayInTheDepot) {
   EXPECT_EQ(deploy({"..", "--version", "1"}).code, 2);
   EXPECT_EQ(deploy({"ux", "--version", "../../etc"}).code, 2);
   EXPECT_EQ(run({"deploy", directory_ / "bundle/install.sh", "ux", "--version", "1"}).code, 2);  // no folder
+  EXPECT_THAT(daemon_.log(), ElementsAre());
+}
+
+TEST_F(Deploy, RefusesARequestThatCannotBeSentBeforeItSendsFiles) {
+  const std::vector<std::string> cases[] = {{"\xFF", "--version", "1"},
+                                            {"ux", "--version", "1", "--transid", "\xFF"},
+                                            {"ux", "--version", "1", "--command", std::string(65536, 'x')}};
+  for (std::vector<std::string> arguments : cases) {
+    VmqctlResult result = deploy(arguments);
+    EXPECT_EQ(result.code, 2);
+    EXPECT_EQ(result.out, "");
+    arguments.emplace_back("--dry-run");
+    result = deploy(arguments);
+    EXPECT_EQ(result.code, 2);
+    EXPECT_EQ(result.out, "");
+  }
   EXPECT_THAT(daemon_.log(), ElementsAre());
 }
 

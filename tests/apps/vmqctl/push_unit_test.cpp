@@ -240,6 +240,22 @@ TEST_F(PushPlanTest, TwoFilesOfOneNameAreRefused) {
   EXPECT_EQ(refusal([&] { plan_.check(); }), first + " and " + second + " would both become a. Nothing was sent.");
 }
 
+TEST_F(PushPlanTest, FileWithTheNameOfAFolderIsRefused) {
+  const std::string file = directory_.writeFile("1/a/b", "");
+  const std::string inFolder = directory_.writeFile("2/a/b/c/d", "");
+  plan_.add(directory_ / "2/a", "");
+  plan_.add(directory_ / "1/a", "");
+  EXPECT_EQ(refusal([&] { plan_.check(); }), file + " would become the file a/b, and " + inFolder +
+                                                 " would be in a folder of that name. Nothing was sent.");
+}
+
+TEST_F(PushPlanTest, FileWithTheBeginningOfTheNameOfAFolderIsNot) {
+  directory_.writeFile("1/a", "");
+  directory_.writeFile("1/ab/c", "");
+  plan_.addContents(directory_ / "1", "");
+  EXPECT_EQ(refusal([&] { plan_.check(); }), "");
+}
+
 TEST_F(PushPlanTest, DestinationOf1024CharactersIsTheLongest) {
   directory_.writeFile("a\xC3\xA4", "");  // two characters
   plan_.add(directory_ / "a\xC3\xA4", "");
@@ -400,6 +416,17 @@ TEST(TransferLine, CountsFilesWhenTheyAreAllEmptyAndNeverExceedsTheWhole) {
   state.bytesDone = 20;
   state.bytesTotal = 10;  // a file has grown since it was counted
   EXPECT_THAT(transferLine(state), testing::StartsWith("100 % [####################] "));
+}
+
+TEST(TransferLine, SaysWhenAFileIsOnlyCompared) {
+  TransferState state;
+  state.bytesDone = 10;
+  state.bytesTotal = 10;
+  state.fileNumber = 3;
+  state.files = 12;
+  state.name = "ux/a.bin";
+  state.verifying = true;
+  EXPECT_EQ(transferLine(state), "verifying ux/a.bin, file 3 of 12");
 }
 
 TEST(TransferLine, LongTimesHaveHours) {

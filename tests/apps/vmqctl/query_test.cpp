@@ -83,7 +83,7 @@ TEST_F(QueryTest, TimeOutIsTold) {
   daemon_.on("POST /v1/tables/KINAGT/query", [](Exchange& exchange) { exchange.awaitClose(); });
   const VmqctlResult result = run({"query", "KINAGT", "--timeout", "1"});
   EXPECT_EQ(result.code, 6);
-  EXPECT_EQ(result.err, "vmqctl: The daemon did not answer within 1 seconds. Allow it more with --timeout.\n");
+  EXPECT_EQ(result.err, "vmqctl: The daemon did not answer within 1 second. Allow it more with --timeout.\n");
 }
 
 TEST_F(QueryTest, CtrlCEndsIt) {

@@ -415,7 +415,7 @@ TEST_F(RequestTest, TimeOutBeforeTheStreamIsOpenSendsNothing) {
   const VmqctlResult result = run({"start", "ux", "--transid", "t1", "--timeout", "1"});
   EXPECT_EQ(result.code, 6);
   EXPECT_EQ(result.err, asking +
-                            "vmqctl: The daemon did not open its event stream within 1 seconds; START of ux was not "
+                            "vmqctl: The daemon did not open its event stream within 1 second; START of ux was not "
                             "sent. Look at the daemon with: vmqctl status.\n");
   EXPECT_THAT(daemon_.log(), ElementsAre(eventsRequest + "?TRANSID=t1"));
 }
@@ -426,7 +426,7 @@ TEST_F(RequestTest, TimeOutBeforeTheAnswerSaysHowToGoOn) {
   const VmqctlResult result = run({"start", "ux", "--transid", "t1", "--timeout", "1"});
   EXPECT_EQ(result.code, 6);
   EXPECT_EQ(result.err, asking +
-                            "vmqctl: The daemon did not answer START of ux within 1 seconds; it may have taken it. " +
+                            "vmqctl: The daemon did not answer START of ux within 1 second; it may have taken it. " +
                             watchT1(daemon_.socket()));
 }
 
@@ -437,7 +437,7 @@ TEST_F(RequestTest, TimeOutBeforeTheEventSaysHowToGoOn) {
   EXPECT_EQ(result.code, 6);
   EXPECT_EQ(result.err,
             asking + "accepted, waiting for its status event, 1 s at most\n" +
-                "vmqctl: No status event of START of ux came within 1 seconds; the daemon goes on with it. " +
+                "vmqctl: No status event of START of ux came within 1 second; the daemon goes on with it. " +
                 watchT1(daemon_.socket()));
   EXPECT_EQ(result.out, "");
 }

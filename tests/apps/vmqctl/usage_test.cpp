@@ -6,6 +6,7 @@
 #include <sys/un.h>
 #include <unistd.h>
 
+#include "tests/apps/vmqctl/scripted_daemon.h"
 #include "tests/apps/vmqctl/vmqctl_process.h"
 #include "tests/support/temporary_directory.h"
 
@@ -23,11 +24,15 @@ TEST(Usage, MistakesAreToldInASentenceAndEndWithTwo) {
   const std::string longId(85, 'x');
   const Case cases[] = {
       {{}, "No verb is given. See vmqctl --help."},
-      {{"pause"}, "The following argument was not expected: pause. See vmqctl --help."},
+      {{"pause"}, "There is no verb pause. See vmqctl --help."},
+      {{"strat", "ux", "--no-wait"}, "There is no verb strat. See vmqctl --help."},
+      {{"--force"}, "The following argument was not expected: --force. See vmqctl --help."},
       {{"start"}, "PRODUCT is required. See vmqctl start --help."},
       {{"start", ""}, "PRODUCT: must not be empty. See vmqctl start --help."},
       {{"start", "ux", "lz"}, "The following argument was not expected: lz. See vmqctl start --help."},
       {{"start", "ux", "--force"}, "The following argument was not expected: --force. See vmqctl start --help."},
+      {{"start", "ux", "a", "--force", "b]"},
+       "The following arguments were not expected: a --force b]. See vmqctl start --help."},
       {{"start", "ux", "--target", ""}, "--target: must not be empty. See vmqctl start --help."},
       {{"start", "ux", "--instance", ""}, "--instance: must not be empty. See vmqctl start --help."},
       {{"start", "ux", "--target", "a", "--instance", "b"}, "--target excludes --instance. See vmqctl start --help."},
@@ -38,10 +43,24 @@ TEST(Usage, MistakesAreToldInASentenceAndEndWithTwo) {
        "--target."},
       {{"start", "ux", "--transid", longId}, "--transid: longer than 84 bytes. See vmqctl start --help."},
       {{"start", "ux", "--transid", ""}, "--transid: must not be empty. See vmqctl start --help."},
-      {{"start", "ux", "--timeout", "-1"}, "Could not convert: --timeout = -1. See vmqctl start --help."},
-      {{"start", "ux", "--timeout", "5s"}, "Could not convert: --timeout = 5s. See vmqctl start --help."},
+      {{"start", "ux", "--timeout", "-1"},
+       "--timeout: must be a whole number of seconds from 0 to 4294967295. See vmqctl start --help."},
+      {{"start", "ux", "--timeout", "5s"},
+       "--timeout: must be a whole number of seconds from 0 to 4294967295. See vmqctl start --help."},
       {{"start", "ux", "--timeout", "4294967296"},
-       "Could not convert: --timeout = 4294967296. See vmqctl start --help."},
+       "--timeout: must be a whole number of seconds from 0 to 4294967295. See vmqctl start --help."},
+      {{"start", "ux", "--transid", "\xFF"}, "A value of the request is not UTF-8 text. Give it in UTF-8."},
+      {{"start", "ux", "--dry-run", "--target", "\xFF"}, "A value of the request is not UTF-8 text. Give it in UTF-8."},
+      {{"start", std::string(65536, 'x')}, "The value of PRODUCT has 65536 bytes; a request holds at most 65535."},
+      {{"watch", "\xFF"}, "A value of the request is not UTF-8 text. Give it in UTF-8."},
+      {{"inventory", "\xFF"}, "A value of the request is not UTF-8 text. Give it in UTF-8."},
+      {{"set-config", "ux", ""}, "FILE: must not be empty. See vmqctl set-config --help."},
+      {{"set-da-config", "--script", "a.sh,b.sh"},
+       "--script: must not hold a comma, which would make two names of it. See vmqctl set-da-config --help."},
+      {{"deploy", "b", "u x", "--version", "1"},
+       "PRODUCT: must not hold blanks, at which command lines are split. See vmqctl deploy --help."},
+      {{"deploy", "b", "ux", "--version", "1\t2"},
+       "--version: must not hold blanks, at which command lines are split. See vmqctl deploy --help."},
       {{"start", "ux", "-o", "xml"}, "--output: xml not in {table,json}. See vmqctl start --help."},
       {{"query"}, "TABLE is required. See vmqctl query --help."},
       {{"query", "KINAGT", "PRODUCT"},
@@ -51,11 +70,11 @@ TEST(Usage, MistakesAreToldInASentenceAndEndWithTwo) {
       {{"query", "KINAGT", "A=1", "A=2"}, "The column A is given twice. Give each column once."},
       {{"watch", "a", "b"}, "The following argument was not expected: b. See vmqctl watch --help."},
       {{"watch", ""}, "TRANSID: must not be empty. See vmqctl watch --help."},
-      {{"watch", "--count", "0"}, "--count: Value 0 not in range 1 to 4294967295. See vmqctl watch --help."},
-      {{"status", "--socket", ""}, "The path of the socket is empty. Give --socket a path of 1 to 107 bytes."},
+      {{"watch", "--count", "0"}, "--count: must be a whole number from 1 to 4294967295. See vmqctl watch --help."},
+      {{"status", "--socket", ""}, "--socket: must not be empty. See vmqctl status --help."},
       {{"status", "--socket", std::string(108, 'x')},
-       "The path of the socket is too long: " + std::string(108, 'x') + ". Give --socket a path of 1 to 107 bytes."},
-      {{"start\x1b[2J"}, "The following argument was not expected: start\\x1b[2J. See vmqctl --help."},
+       "The path of the socket is too long: " + std::string(108, 'x') + ". Give --socket a path of at most 107 bytes."},
+      {{"start\x1b[2J"}, "There is no verb start\\x1b[2J. See vmqctl --help."},
   };
   for (const Case& each : cases) {
     const VmqctlResult result = runVmqctl(each.arguments);
@@ -89,6 +108,18 @@ TEST(Usage, HelpOfEachVerbHasAnExampleAndTheCommonOptions) {
     EXPECT_THAT(result.out,
                 AllOf(HasSubstr("Usage: vmqctl " + verb), HasSubstr("\n  vmqctl " + verb), HasSubstr("--socket PATH"),
                       HasSubstr("-o,--output table|json"), HasSubstr("--timeout SECONDS")));
+  }
+}
+
+// What is opened must not take the place of a stream that is closed.
+TEST(Usage, ClosedStandardStreamsAreNoStreams) {
+  ScriptedDaemon daemon;
+  daemon.on("POST /v1/tables/T/query", [](Exchange& exchange) { exchange.reply(200, R"({"rows":[{"A":1}]})"); });
+  const TemporaryDirectory directory;
+  for (const char* closed : {">&-", "2>&-", "<&- >&- 2>&-"}) {
+    VmqctlOptions options;
+    options.program = directory.writeScript("run", std::string("exec " VMQCTL_PROGRAM " \"$@\" ") + closed);
+    EXPECT_EQ(runVmqctl({"query", "T", "--socket", daemon.socket()}, options).code, 0) << closed;
   }
 }
 

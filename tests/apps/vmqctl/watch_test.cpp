@@ -151,7 +151,7 @@ TEST_F(WatchTest, TimeOutIsTold) {
   sendEvents({});
   const VmqctlResult result = watch({"--timeout", "1"});
   EXPECT_EQ(result.code, 6);
-  EXPECT_THAT(result.err, HasSubstr("vmqctl: The 1 seconds of --timeout are over.\n"));
+  EXPECT_THAT(result.err, HasSubstr("vmqctl: The time of --timeout, 1 second, is over.\n"));
 }
 
 TEST_F(WatchTest, EventWithoutAReturnValueIsTold) {
