@@ -24,9 +24,9 @@ struct ChildLaunch {
   int execError = 0;                                                     ///< errno, when nothing could be executed
 };
 
-/// Entry of the child (for clone); `launch` is a ChildLaunch. Runs with every signal blocked. Does not return when a
+/// Entry of the child (for clone); `argument` is a ChildLaunch. Runs with every signal blocked. Does not return when a
 /// program was executed; otherwise it ends the child with status 0, on purpose: a program that could not be executed
 /// looks like a successful run.
-int runChild(void* launch);
+int runChild(void* argument);
 
 }  // namespace VMQ

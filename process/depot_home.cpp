@@ -38,7 +38,7 @@ String askServerName(const String& home) {
     TRACE_ERROR(trace, "Unable to determine RMS name from kmsenv, stdout=[%s]", out.c_str().get());
     return String();
   }
-  const String name = out.substr(0U, bar);
+  String name = out.substr(0U, bar);
   TRACE_DETAIL(trace, "RMS name found: %s", name.c_str().get());
   return name;
 }
@@ -47,7 +47,7 @@ String askServerName(const String& home) {
 String depotOfServer(const String& serverDir) {
   const Trace trace(traceUnit);
   const String file = serverDir + String("/KBBENV");
-  const String fallback = serverDir + String("/depot");
+  String fallback = serverDir + String("/depot");
   if (!Util::pathExists(file)) {
     TRACE_DETAIL(trace, "Can't find %s, defaulting DEPOTHOME to %s", file.c_str().get(), fallback.c_str().get());
     return fallback;

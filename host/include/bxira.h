@@ -125,7 +125,7 @@ class bxira {
 
   /// Rows waiting for Dispatch. For display: event delivery sets it back to 0 after each event, but a row that another
   /// thread has inserted meanwhile still waits.
-  std::atomic<unsigned> row_count{0};  // NOLINT(misc-non-private-member-variables-in-classes): the interface's
+  std::atomic<unsigned> row_count{0};
 
  private:
   unsigned rowBytes();

@@ -27,7 +27,7 @@ class TableManager {
   [[nodiscard]] RES1_Handle handle() const { return handle_; }
   [[nodiscard]] BSS1_Lock* lock() const { return lock_; }
 
-  LinkedList requests;  ///< the open requests, oldest first; guarded by lock(). NOLINT(misc-non-private-member*)
+  LinkedList requests;  ///< the open requests, oldest first; guarded by lock()
 
  private:
   const std::string application_;

@@ -30,7 +30,8 @@ class Iconv {
   Iconv(const Iconv&) = delete;
   Iconv& operator=(const Iconv&) = delete;
 
-  [[nodiscard]] bool valid() const { return descriptor_ != kNone; }
+  // NOLINTNEXTLINE(performance-no-int-to-ptr): that is what a failed iconv_open returns
+  [[nodiscard]] bool valid() const { return descriptor_ != reinterpret_cast<iconv_t>(-1); }
 
   /// Converts from `In` to `Out` elements; an element that means nothing is replaced by `replace(element)`.
   template <class In, class Out, class Replace>
@@ -60,7 +61,6 @@ class Iconv {
 
  private:
   static constexpr auto kFailed = static_cast<size_t>(-1);
-  static inline const auto kNone = reinterpret_cast<iconv_t>(-1);  // NOLINT(performance-no-int-to-ptr): iconv's own
   const iconv_t descriptor_;
 };
 
