@@ -144,9 +144,9 @@ TEST_F(AgentScript, StalePidFileDoesNotKeepTheAgentFromStarting) {
   const Bystander bystander;
   const std::string other = std::to_string(bystander.pid);
   fs::create_directories(home / "run");
-  for (const std::string& stale : {std::string(), std::string("\n"), other + "\n", other + " 1\n",
-                                   std::string("-999999999 1\n"), std::string("self 1\n"),
-                                   std::string("999999999 12\n"), other + " 2 3\n", "../" + other + " x"}) {
+  for (const std::string& stale :
+       {std::string(), std::string("\n"), other + "\n", other + " 1\n", std::string("-999999999 1\n"),
+        std::string("self 1\n"), std::string("999999999 12\n"), other + " 2 3\n", "../" + other + " x"}) {
     SCOPED_TRACE(stale);
     std::ofstream(home / "run/ux.pid") << stale;
     EXPECT_EQ(home.control("status ux").exit_code, 3);

@@ -57,11 +57,10 @@ TEST_F(Client, SuccessfulRestartTellsThatItsStopFailed) {
 TEST_F(Client, WatchShowsTheOutcomeOfARequestThatWasNotWaitedFor) {
   const TemporaryDirectory folder;
   const std::string told = quoted(folder / "told");
-  const Outcome outcome = runShell("export VMQ_SOCKET=" + quoted(daemon->socket()) +
-                                   "; " VMQ_PROGRAMS "/vmqctl watch t1 --count 1 --timeout 60 2>" + told +
-                                   " & until grep -qs watching " + told +
-                                   " || ! kill -0 $!; do sleep 0.1; done; " VMQ_PROGRAMS
-                                   "/vmqctl start ux --transid t1 --no-wait && wait $!");
+  const Outcome outcome = runShell(
+      "export VMQ_SOCKET=" + quoted(daemon->socket()) + "; " VMQ_PROGRAMS "/vmqctl watch t1 --count 1 --timeout 60 2>" +
+      told + " & until grep -qs watching " + told +
+      " || ! kill -0 $!; do sleep 0.1; done; " VMQ_PROGRAMS "/vmqctl start ux --transid t1 --no-wait && wait $!");
   EXPECT_EQ(outcome.exit_code, 0) << outcome.output;
   EXPECT_THAT(outcome.output, HasSubstr("t1: START on " + std::string(DaemonFixture::node) + " done"));
 }

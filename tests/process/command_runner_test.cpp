@@ -208,7 +208,8 @@ TEST_F(CommandRunner, AgentCommandIsOneWhoseTextContainsTheNameAnywhere) {
 }
 
 TEST_F(CommandRunner, AgentLeftBehindDoesNotHoldTheRun) {
-  EXPECT_EQ(run(agentScript("while [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done &\necho started")), success("started\n"));
+  EXPECT_EQ(run(agentScript("while [ ! -e go ] && [ -e $0 ]; do sleep 0.01; done &\necho started")),
+            success("started\n"));
   letGo();
 }
 

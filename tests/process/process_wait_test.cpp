@@ -127,9 +127,9 @@ TEST_F(ProcessWait, TimeoutIsRoundedUpToTheNextSlice) {
 
 TEST_F(ProcessWait, ChildThatLeadsAGroupIsKilledWithIt) {
   const TEST_RecordedWaits waits;
-  // setsid keeps the process id: the child leads the group of the one that waits, which ends with the directory at last.
-  const std::string leader = directory.writeScript(
-      "leader", "while [ -e \"$0\" ]; do sleep 0.01; done &\necho $!\necho $$\nwait\n");
+  // setsid keeps the process id: the child leads the group that the waiting one is in, which ends with the directory.
+  const std::string leader =
+      directory.writeScript("leader", "while [ -e \"$0\" ]; do sleep 0.01; done &\necho $!\necho $$\nwait\n");
   Process process(("/usr/bin/setsid " + leader).c_str());
   ASSERT_TRUE(process.start());
   const pid_t member = readPid(process);

@@ -72,7 +72,8 @@ void ScratchFileSystem::fill() const {
   const char block[512] = {};
   size_t written = 0;
   ssize_t count = 0;
-  while (written < 2 * bytes_ && (count = ::write(file, block, sizeof block)) > 0) written += static_cast<size_t>(count);
+  while (written < 2 * bytes_ && (count = ::write(file, block, sizeof block)) > 0)
+    written += static_cast<size_t>(count);
   const int error = errno;
   close(file);
   ASSERT_LT(count, 0) << "twice its size fits into " << directory_;

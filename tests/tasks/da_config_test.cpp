@@ -1,5 +1,5 @@
-// What SETCONFIG for the data agent does when the system refuses what mostly works. Its requests, as a server sends them,
-// are in tests/mgmt.
+// What SETCONFIG for the data agent does when the system refuses what mostly works. Its requests, as a server sends
+// them, are in tests/mgmt.
 #include "tasks/da_config.h"
 
 #include <gtest/gtest.h>
@@ -19,8 +19,8 @@ using VMQ::String;
 TEST(DataAgentScripts, WhoseModeCannotBeSetAreTracedAndTheNextIsCopied) {
   const InstallationHome home;
   home.tool("bin/qinfo", "echo 'Platform codes:'; echo 'lx8266 Product (um)'");
-  home.file("config/um.config", "KUMP_META_PATH=" + home.path() + "/meta\nKUM_WORK_PATH=" + home.path() +
-                                    "/work/um\nKUMP_RB_PATH=rb\n");
+  home.file("config/um.config",
+            "KUMP_META_PATH=" + home.path() + "/meta\nKUM_WORK_PATH=" + home.path() + "/work/um\nKUMP_RB_PATH=rb\n");
   for (const char* name : {"depot/s1.sh", "depot/s2.sh", "work/scripts/.keep"}) home.file(name, name);
   depotDir = String(home.depot().c_str());
   TaskQueueElem request;

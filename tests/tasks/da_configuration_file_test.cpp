@@ -107,8 +107,8 @@ TEST_F(StartupParms, LineOfTheInstanceIsReplacedAndTheOthersStay) {
   EXPECT_TRUE(change());
   EXPECT_EQ(readWholeFile(list), after);
   EXPECT_FALSE(fs::exists(copy));
-  EXPECT_TRUE(trace.has(RAS1_DETAIL,
-                        "Writing startup parms [asfs,SNMP] to config file [" + list + "] instance [inst1]"));
+  EXPECT_TRUE(
+      trace.has(RAS1_DETAIL, "Writing startup parms [asfs,SNMP] to config file [" + list + "] instance [inst1]"));
 }
 
 TEST_F(StartupParms, MissingOrEmptyListIsAFailure) {

@@ -110,8 +110,9 @@ TEST(SlowSenders, AreDroppedWhereverTheyAre) {
   const GoodClient good(daemon);
   const std::string post = "POST /v1/tables/ECHO/query HTTP/1.1\r\nHost: x\r\n";
   std::map<std::string, std::unique_ptr<HttpClient>> slow;
-  for (const std::string& begun : {std::string("GET /v1/health HTTP/1.1\r\nX: "), post + "Content-Length: 100000\r\n\r\n",
-                                   post + "Transfer-Encoding: chunked\r\n\r\nfffff\r\n"}) {
+  for (const std::string& begun :
+       {std::string("GET /v1/health HTTP/1.1\r\nX: "), post + "Content-Length: 100000\r\n\r\n",
+        post + "Transfer-Encoding: chunked\r\n\r\nfffff\r\n"}) {
     slow[begun] = std::make_unique<HttpClient>(daemon.socket());
     ASSERT_TRUE(slow[begun]->send(begun));
   }
