@@ -52,10 +52,10 @@ const Names kChild = kAnswer + Names{"pipe2", "mmap", "clone", "eventfd", "pthre
                                      "BSS1_ReleaseLock"};
 // Of several children one is not at its end yet when it is looked at.
 const Names kChildren = kChild + Names{"poll", "BSS1_TimedWait"};
-const Names kRunAsFile = {"uname",  "fopen",  "stat", "fseek", "ftell", "fread", "fclose", "XML1_ParserCreate",
-                          "XML1_GetBuffer", "XML1_ParseBuffer"};
-
+const Names kRunAsFile = {"uname", "fopen", "stat", "fseek", "ftell", "fread", "fclose",
+                          "XML1_ParserCreate", "XML1_GetBuffer", "XML1_ParseBuffer"};
 // clang-format on
+
 const std::map<std::string, std::string> kRunAsFileTells = {
     {"fread", "Error reading file (defaults will be used): ~/config/"}};
 
@@ -130,17 +130,18 @@ const std::vector<CommandCase>& commandCases() {
 }
 
 const std::set<std::string>& callsOfTheTransfer() {
-  static const auto& kCalls = *new std::set<std::string>{
-      "access", "mkdir",  "unlink", "fopen", "writev", "fclose",      "chmod",       "open",  "fdopen",
-      "stat",   "fread",  "fwrite", "link",  "rpc__malloc"};
+  static const auto& kCalls =
+      *new std::set<std::string>{"access", "mkdir",  "unlink", "fopen", "writev", "fclose", "chmod",
+                                 "open",   "fdopen", "stat",   "fread", "fwrite", "link",   "rpc__malloc"};
   return kCalls;
 }
 
 void prepareMachine(const InstallationHome& home) {
   home.clear();
   home.tool("bin/qinfo", kInventory);
-  home.tool("bin/CorvelAgent", atHome(home, "case $* in *zz) ;; *) echo \"$@\" >> ~/runs ;; esac\n"
-                                         "[ -z \"$KBB_RAS1_LOG\" ] || echo trace >> $KBB_RAS1_LOG"));
+  home.tool("bin/CorvelAgent", atHome(home,
+                                      "case $* in *zz) ;; *) echo \"$@\" >> ~/runs ;; esac\n"
+                                      "[ -z \"$KBB_RAS1_LOG\" ] || echo trace >> $KBB_RAS1_LOG"));
   home.tool("bin/uninstall.sh", atHome(home, "echo \"$@\" > ~/uninstalled"));
   home.tool("bin/um_console", atHome(home, "echo \"$4\" >> ~/console\ncase $4 in getdptype*) echo snmp ;; esac"));
   home.tool("zlpqor6/lx8266/bin/vmq_xa", atHome(home, kTranslator));

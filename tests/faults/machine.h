@@ -29,8 +29,8 @@ struct CommandCase {
   int allocations = 0;  ///< and so many of these at least
   /// What the trace must tell when a function fails: function, how the line begins.
   std::map<std::string, std::string> tells = {};
-  /// None: every function is failed. Otherwise only these, in a host that traces and wants its children to, and whatever
-  /// they do, the command ends as if nothing had failed.
+  /// None: every function is failed. Otherwise only these, in a host that traces and wants its children to, and the
+  /// command ends as if nothing had failed.
   std::set<std::string> harmless = {};
 };
 

@@ -86,9 +86,9 @@ bool SavingTheRunAsFile::survives(int nth, bool file_exists) {
   } else {
     EXPECT_EQ(contents(), before);
     EXPECT_EQ(saved, !GetParam().opens);
-    EXPECT_THAT(errors, testing::ElementsAre(
-                            GetParam().opens ? "Error opening file, " + path_ + ", in write mode: %"
-                                             : "Error writing file " + path_ + ", it stays as it was: " + reason));
+    EXPECT_THAT(errors, testing::ElementsAre(GetParam().opens
+                                                 ? "Error opening file, " + path_ + ", in write mode: %"
+                                                 : "Error writing file " + path_ + ", it stays as it was: " + reason));
   }
   const long files = std::distance(fs::directory_iterator(directory_.path()), fs::directory_iterator());
   EXPECT_EQ(files, fs::exists(path_) ? 1 : 0) << "something is left beside it";

@@ -24,18 +24,3 @@ Footprint Footprint::of(pid_t process) {
   }
   return footprint;
 }
-
-double memorySlope(const std::vector<Footprint>& footprints) {
-  double mean_requests = 0, mean_memory = 0;
-  for (const Footprint& footprint : footprints) {
-    mean_requests += footprint.requests / static_cast<double>(footprints.size());
-    mean_memory += static_cast<double>(footprint.resident_kib) / static_cast<double>(footprints.size());
-  }
-  double covariance = 0, variance = 0;
-  for (const Footprint& footprint : footprints) {
-    const double requests = footprint.requests - mean_requests;
-    covariance += requests * (static_cast<double>(footprint.resident_kib) - mean_memory);
-    variance += requests * requests;
-  }
-  return variance > 0 ? covariance / variance * 1000 : 0;
-}

@@ -3,8 +3,6 @@
 
 #include <sys/types.h>
 
-#include <vector>
-
 struct Footprint {
   double requests = 0;  ///< that it has answered until then
   long resident_kib = 0;
@@ -14,6 +12,3 @@ struct Footprint {
 
   static Footprint of(pid_t process);
 };
-
-/// The slope of the straight line that fits the resident memory best, in KiB for 1000 requests.
-double memorySlope(const std::vector<Footprint>& footprints);
