@@ -185,9 +185,13 @@ bool doesNotGrow(const std::vector<Footprint>& at_rest) {
   const Footprint& first = at_rest.front();
   const Footprint& last = at_rest.back();
   const Growth growth(at_rest);
-  std::printf("resident memory: %+ld KiB in the last %.0f requests, %+.1f for 1000 (in all, %.0f are tolerable)\n",
-              growth.kib, growth.requests, static_cast<double>(growth.kib) * 1000 / growth.requests,
-              growth.tolerable());
+  std::printf("resident memory: %+ld KiB in the last %.0f requests, %+.1f for 1000", growth.kib, growth.requests,
+              static_cast<double>(growth.kib) * 1000 / growth.requests);
+  if (memoryTells) {
+    std::printf(" (in all, %.0f are tolerable)\n", growth.tolerable());
+  } else {
+    std::printf(" (not judged: a sanitizer keeps what is freed)\n");
+  }
   std::printf("threads: %+d, descriptors: %+d since the warm-up\n", static_cast<int>(last.threads - first.threads),
               static_cast<int>(last.descriptors - first.descriptors));
   bool fine = growth.isTolerable();
