@@ -20,7 +20,7 @@ class ProcessStream {
   void attach(int descriptor) { descriptor_ = descriptor; }
   /// Makes every later read or write return at once (EAGAIN instead of waiting). The child's end is not affected.
   /// False, with a trace, when the descriptor does not allow it.
-  bool setNonBlocking();
+  bool setNonBlocking();  // NOLINT(readability-make-member-function-const): the stream is another one then
   /// Closes the pipe end; a second call does nothing.
   void close();
 

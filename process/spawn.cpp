@@ -38,8 +38,8 @@ RAS1_Unit traceUnit{"process/spawn"};
 #endif
 
 constexpr char kShell[] = "/bin/sh";
-constexpr size_t kChildStackBytes = 64 * 1024;    // runChild calls nothing but the kernel
-constexpr size_t kWaiterStackBytes = 256 * 1024;  // the waiter waits and traces
+constexpr size_t kChildStackBytes = size_t{64} * 1024;    // runChild calls nothing but the kernel
+constexpr size_t kWaiterStackBytes = size_t{256} * 1024;  // the waiter waits and traces
 
 /// The stack of a child that shares our memory: it must not be the caller's, which is in use.
 class ChildStack {
@@ -136,6 +136,7 @@ bool forkAndExecute(char** argv, const char* const* env, const std::shared_ptr<P
 
   const std::vector<std::string> files = execCandidates(argv[0], environment);
   std::vector<const char*> candidates;
+  candidates.reserve(files.size() + 1);
   for (const std::string& file : files) candidates.push_back(file.c_str());
   candidates.push_back(nullptr);
 

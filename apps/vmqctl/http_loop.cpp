@@ -17,7 +17,7 @@ void check(Code code) {
   if (code != Code{}) throw std::runtime_error("the HTTP library refuses: " + std::to_string(code));
 }
 
-constexpr std::size_t sentUnasked = 64 * 1024;  // less than a socket takes at once
+constexpr std::size_t sentUnasked = std::size_t{64} * 1024;  // less than a socket takes at once
 constexpr long uploadBufferBytes = 256 * 1024;
 
 /// Sets the library up once; it is told to leave when the process ends.

@@ -14,7 +14,7 @@ namespace vmqd {
 namespace {
 
 constexpr size_t streamBlockBytes = 8192;
-constexpr size_t keptBufferBytes = 64 * 1024;  // of each buffer, from one request to the next
+constexpr size_t keptBufferBytes = size_t{64} * 1024;  // of each buffer, from one request to the next
 
 struct DestroyResponse {
   void operator()(MHD_Response* response) const { MHD_destroy_response(response); }

@@ -14,8 +14,9 @@
 namespace vmqd {
 namespace {
 
-constexpr size_t headerBytes = 32 * 1024;  // of one connection: request header, reply header, and the body's next piece
-constexpr unsigned turnedAway = 64;        // connections beyond the limit that can be told so at a time
+// Of one connection: request header, reply header, and the body's next piece.
+constexpr size_t headerBytes = size_t{32} * 1024;
+constexpr unsigned turnedAway = 64;  // connections beyond the limit that can be told so at a time
 
 HttpConnection* connectionOf(MHD_Connection* connection) {
   const auto* const info = MHD_get_connection_info(connection, MHD_CONNECTION_INFO_SOCKET_CONTEXT);

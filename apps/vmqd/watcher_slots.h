@@ -15,6 +15,8 @@ class WatcherSlots {
   class Slot {
    public:
     explicit Slot(WatcherSlots& slots) : slots_(&slots) {}
+    Slot(const Slot&) = delete;
+    Slot& operator=(const Slot&) = delete;
     Slot(Slot&& other) noexcept : slots_(std::exchange(other.slots_, nullptr)) {}
     Slot& operator=(Slot&&) = delete;
     ~Slot() {
