@@ -3,7 +3,6 @@
 #include <memory>
 
 #include "apps/vmqctl/commands/verbs.h"
-#include "apps/vmqctl/failure.h"
 
 namespace vmqctl {
 namespace {

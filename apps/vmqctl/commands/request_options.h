@@ -1,7 +1,6 @@
 #pragma once
 // What every verb that sends a request takes on the command line, and how the request is then run.
 
-#include <memory>
 #include <string>
 
 #include "apps/vmqctl/command_line.h"
