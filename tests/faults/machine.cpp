@@ -148,8 +148,7 @@ void prepareMachine(const InstallationHome& home) {
   home.tool("depot/install.sh", atHome(home, "echo \"$@\" > ~/installed"));
   // Longer than the C library reads when it asks for the length: the reading itself can then fail.
   home.runAsFile(InstallationHome::runAs("lz", "other", "nobody") + "<!--" + std::string(20000, '.') + "-->");
-  home.file("depot/rc.txt", "3
-");
+  home.file("depot/rc.txt", "3\n");
   home.file("depot/m.mdl", "model\n");
   home.file("depot/s1.sh", "one\n");
   home.file("config/um_inst1.config", atHome(home, kDataAgent));
