@@ -24,7 +24,9 @@ else()
   add_compile_options(-fstack-protector-strong)
 endif()
 if(VMQ_COVERAGE)
-  # The counters of several threads add up, and those of a child that shares its parent's memory are the parent's.
+  # The counters of several threads add up, and those of a child that shares its parent's memory are the parent's. A
+  # program that runs as another user may not write its counters, and says so where GCOV_ERROR_FILE of the tests' preset
+  # tells it to.
   add_compile_options(--coverage -fprofile-abs-path -fprofile-update=atomic)
   add_compile_definitions(VMQ_COVERAGE)
   add_link_options(--coverage)
