@@ -9,7 +9,7 @@ Watcher::Watcher(const std::string& socket, const std::string& query) : client_(
 
 nlohmann::json Watcher::next() {
   while (const auto event = client_.nextEvent())
-    if (event->name == "row") return nlohmann::json::parse(event->data);
+    if (event->name == "row") return parsedJson(event->data);
   return nullptr;
 }
 
@@ -43,7 +43,7 @@ nlohmann::json Deployment::query(const std::string& table, const Json& predicate
   const HttpReply reply =
       HttpClient(daemon->socket()).post("/v1/tables/" + table + "/query", Json{{"predicates", predicates}}.dump());
   EXPECT_EQ(reply.status, 200) << reply.body;
-  return Json::parse(reply.body)["rows"];
+  return parsedJson(reply.body)["rows"];
 }
 
 nlohmann::json Deployment::ask(const Json& request) {

@@ -4,13 +4,13 @@
 #include <gmock/gmock.h>
 
 #include <memory>
-#include <nlohmann/json.hpp>
 #include <string>
 #include <vector>
 
 #include "tests/e2e/sample_home.h"
 #include "tests/support/daemon_fixture.h"
 #include "tests/support/http_client.h"
+#include "tests/support/json.h"
 
 /// A client that watches the outcomes of requests. From its construction on nothing is missed.
 class Watcher {

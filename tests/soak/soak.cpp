@@ -14,7 +14,6 @@
 #include <filesystem>
 #include <limits>
 #include <memory>
-#include <nlohmann/json.hpp>
 #include <stdexcept>
 #include <string>
 #include <thread>
@@ -25,6 +24,7 @@
 #include "tests/soak/event_watchers.h"
 #include "tests/support/daemon_fixture.h"
 #include "tests/support/http_client.h"
+#include "tests/support/json.h"
 #include "tests/support/process_memory.h"
 
 namespace {
@@ -128,7 +128,7 @@ struct Client {
   json rowsOf(const std::string& table, const json& predicates) {
     const HttpReply reply = connection->post("/v1/tables/" + table + "/query", json{{"predicates", predicates}}.dump());
     if (reply.status != 200) throw std::runtime_error("a request was refused: " + reply.body);
-    return json::parse(reply.body)["rows"];
+    return parsedJson(reply.body)["rows"];
   }
 };
 

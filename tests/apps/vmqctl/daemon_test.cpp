@@ -6,12 +6,12 @@
 
 #include <csignal>
 #include <filesystem>
-#include <nlohmann/json.hpp>
 
 #include "apps/vmqctl/messages.h"
 #include "tests/apps/vmqctl/vmqctl_process.h"
 #include "tests/support/daemon_fixture.h"
 #include "tests/support/eventually.h"
+#include "tests/support/json.h"
 
 namespace {
 
@@ -153,7 +153,7 @@ TEST_F(DaemonTest, DaemonThatGoesAwayIsTold) {
 TEST_F(DaemonTest, QueryShowsTheAnswerRow) {
   const VmqctlResult result = run({"query", "KAGREQT", "COMMAND=PAUSE", "TRANSID=t1", "RETVAL>=1000", "-o", "json"});
   EXPECT_EQ(result.code, 0);
-  const auto rows = nlohmann::json::parse(result.out);
+  const auto rows = parsedJson(result.out);
   ASSERT_EQ(rows.size(), 1U);
   EXPECT_EQ(rows[0]["ORIGINNODE"], "testnode");
   EXPECT_EQ(rows[0]["TRANSID"], "t1");
@@ -186,7 +186,7 @@ TEST_F(DaemonTest, StatusShowsTheDaemon) {
 }
 
 TEST_F(DaemonTest, StatusInJsonListsTheColumns) {
-  const auto status = nlohmann::json::parse(run({"status", "-o", "json"}).out);
+  const auto status = parsedJson(run({"status", "-o", "json"}).out);
   EXPECT_EQ(status["node"], "testnode");
   EXPECT_EQ(status["health"]["status"], "ok");
   ASSERT_EQ(status["tables"].size(), 3U);

@@ -3,8 +3,9 @@
 
 #include <yaml-cpp/yaml.h>
 
-#include <nlohmann/json.hpp>
 #include <string>
+
+#include "tests/support/json.h"
 
 class ApiDescription {
  public:

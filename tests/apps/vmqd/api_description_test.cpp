@@ -187,7 +187,7 @@ TEST(ApiDescriptionFile, TellsTheStatusAndShapeOfEachReply) {
         if (type == "application/octet-stream") {
           EXPECT_EQ("binary", schema["format"].as<std::string>());
         } else {
-          EXPECT_EQ("", description().mismatch(json::parse(reply.body), schema)) << reply.body;
+          EXPECT_EQ("", description().mismatch(parsedJson(reply.body), schema)) << reply.body;
         }
         for (const auto& header : described["headers"]) {
           EXPECT_EQ(1u, reply.headers.count(lowerCase(header.first.as<std::string>())));
@@ -207,7 +207,7 @@ TEST(ApiDescriptionFile, TellsTheShapeOfEvents) {
   while (seen.size() < schemas.size()) {
     const auto event = watcher.nextEvent();
     ASSERT_TRUE(event && schemas.count(event->name) == 1) << event->name;
-    EXPECT_EQ("", description().mismatch(json::parse(event->data), description().schema(schemas.at(event->name))));
+    EXPECT_EQ("", description().mismatch(parsedJson(event->data), description().schema(schemas.at(event->name))));
     seen.insert(event->name);
   }
 }
@@ -232,7 +232,7 @@ TEST(ApiDescriptionFile, DescribesTheQueriesThatAreAccepted) {
   };
   for (const auto& [body, status] : bodies) {
     SCOPED_TRACE(body);
-    const std::string mismatch = description().mismatch(json::parse(body), description().schema("Query"));
+    const std::string mismatch = description().mismatch(parsedJson(body), description().schema("Query"));
     EXPECT_EQ(status == 200, mismatch.empty()) << mismatch;
     EXPECT_EQ(status, client.post("/v1/tables/ECHO/query", body).status);
   }
@@ -267,17 +267,17 @@ TEST(ApiDescriptionFile, KnowsEveryErrorCode) {
 // The checks above are only worth something if they fail where they should.
 TEST(Mismatches, AreFound) {
   const auto& api = description();
-  EXPECT_EQ("$ is no object", api.mismatch(json::parse("[]"), api.schema("Health")));
-  EXPECT_EQ("$ lacks status", api.mismatch(json::parse(R"({"uptime_seconds":1,"watchers":0})"), api.schema("Health")));
+  EXPECT_EQ("$ is no object", api.mismatch(parsedJson("[]"), api.schema("Health")));
+  EXPECT_EQ("$ lacks status", api.mismatch(parsedJson(R"({"uptime_seconds":1,"watchers":0})"), api.schema("Health")));
   EXPECT_EQ("$.watchers is no integer",
-            api.mismatch(json::parse(R"({"status":"ok","uptime_seconds":1,"watchers":"0"})"), api.schema("Health")));
+            api.mismatch(parsedJson(R"({"status":"ok","uptime_seconds":1,"watchers":"0"})"), api.schema("Health")));
   EXPECT_EQ("$.status is none of the values listed",
-            api.mismatch(json::parse(R"({"status":"bad","uptime_seconds":1,"watchers":0})"), api.schema("Health")));
+            api.mismatch(parsedJson(R"({"status":"bad","uptime_seconds":1,"watchers":0})"), api.schema("Health")));
   EXPECT_EQ(
       "$ has an undescribed member x",
-      api.mismatch(json::parse(R"({"status":"ok","uptime_seconds":1,"watchers":0,"x":1})"), api.schema("Health")));
+      api.mismatch(parsedJson(R"({"status":"ok","uptime_seconds":1,"watchers":0,"x":1})"), api.schema("Health")));
   EXPECT_EQ("$.rows[0].A is 0 of the choices",
-            api.mismatch(json::parse(R"({"table":"T","rows":[{"A":null}]})"), api.schema("Rows")));
+            api.mismatch(parsedJson(R"({"table":"T","rows":[{"A":null}]})"), api.schema("Rows")));
 }
 
 }  // namespace

@@ -18,7 +18,7 @@ std::string commandBody(const std::string& transaction) {
 
 TEST(Component, OffersItsThreeTables) {
   const DaemonFixture daemon;
-  const json tables = json::parse(HttpClient(daemon.socket()).get("/v1/tables").body)["tables"];
+  const json tables = parsedJson(HttpClient(daemon.socket()).get("/v1/tables").body)["tables"];
   std::vector<std::string> names;
   for (const auto& table : tables) {
     EXPECT_EQ("VMQ", table["application"]);
@@ -35,12 +35,12 @@ TEST(Component, AnswersACommandAndReportsItsOutcome) {
   ASSERT_EQ("open", watcher.nextEvent()->name);
   HttpClient client(daemon.socket());
   (void)client.post("/v1/tables/KAGREQT/query", commandBody("t2"));
-  const json row = json::parse(client.post("/v1/tables/KAGREQT/query", commandBody("t1")).body)["rows"][0];
+  const json row = parsedJson(client.post("/v1/tables/KAGREQT/query", commandBody("t1")).body)["rows"][0];
   EXPECT_EQ("testnode", row["ORIGINNODE"]);
   EXPECT_EQ("t1", row["TRANSID"]);
   EXPECT_EQ(0, row["RETVAL"]);
   // The scratch home has no agent control script, so the start fails.
-  const json outcome = json::parse(watcher.nextEvent()->data);
+  const json outcome = parsedJson(watcher.nextEvent()->data);
   EXPECT_EQ("testnode", outcome["ORIGINNODE"]);
   EXPECT_EQ("t1", outcome["TRANSID"]);
   EXPECT_EQ("START", outcome["COMMAND"]);
@@ -50,7 +50,7 @@ TEST(Component, AnswersACommandAndReportsItsOutcome) {
 
 TEST(Component, IsFoundFromWhereTheProgramIs) {
   const DaemonFixture daemon;  // its configuration names no library
-  EXPECT_EQ(3u, json::parse(HttpClient(daemon.socket()).get("/v1/tables").body)["tables"].size());
+  EXPECT_EQ(3u, parsedJson(HttpClient(daemon.socket()).get("/v1/tables").body)["tables"].size());
 }
 
 }  // namespace

@@ -34,7 +34,7 @@ TEST(DepotRoute, TellsSizeAndDigest) {
     EXPECT_EQ(200, reply.status);
     EXPECT_EQ("application/json", reply.headers.at("content-type"));
     const json expected = {{"path", each.name}, {"size", each.contents.size()}, {"sha256", each.sha256}};
-    EXPECT_EQ(expected, json::parse(reply.body));
+    EXPECT_EQ(expected, parsedJson(reply.body));
   }
 }
 

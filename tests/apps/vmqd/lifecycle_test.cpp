@@ -185,7 +185,7 @@ TEST(Stop, LetsARunningQueryEnd) {
   HttpClient client(daemon.socket());
   std::thread asking([&] {
     const HttpReply reply = client.post("/v1/tables/GATE/query", gate.query());
-    EXPECT_EQ("passed", json::parse(reply.body)["rows"][0]["TEXT"]);
+    EXPECT_EQ("passed", parsedJson(reply.body)["rows"][0]["TEXT"]);
   });
   gate.waitForQuery();
   daemon.process().signal(SIGTERM);

@@ -58,7 +58,7 @@ TEST(Push, StoresAFileInChunks) {
   EXPECT_EQ(0u, push(client, "ux\\1.0\\file.bin", 1, std::string(10000, 'a')));
   EXPECT_EQ(0u, push(client, "ux\\1.0\\file.bin", 2, "b\r\n"));
   EXPECT_EQ(std::string(10000, 'a') + "b\r\n", readWholeFile(daemon.depot() + "/ux/1.0/file.bin"));
-  EXPECT_EQ(10003, json::parse(client.get("/v1/depot/ux/1.0/file.bin").body)["size"]);
+  EXPECT_EQ(10003, parsedJson(client.get("/v1/depot/ux/1.0/file.bin").body)["size"]);
 }
 
 TEST(Push, ConvertsScripts) {
@@ -84,7 +84,7 @@ TEST(Push, PacketThatLiesIsAFaultAndStoresNothing) {
   const std::string packet = packetOf("file", 1, "a");
   const HttpReply reply = client.request("POST", operation, packet.substr(0, packet.size() - 1), littleAscii);
   EXPECT_EQ(422, reply.status);
-  EXPECT_EQ(0x1c000007, json::parse(reply.body)["error"]["status"]);
+  EXPECT_EQ(0x1c000007, parsedJson(reply.body)["error"]["status"]);
   EXPECT_FALSE(std::filesystem::exists(daemon.depot() + "/file"));
   EXPECT_EQ(0u, push(client, "file", 1, "a"));
 }

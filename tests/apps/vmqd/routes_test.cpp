@@ -23,7 +23,7 @@ TEST(ServiceRoute, TellsWhatRunsWhere) {
                          {"home", daemon.home()},
                          {"depot", daemon.depot()},
                          {"maximum_packet_bytes", 4194304}};
-  EXPECT_EQ(expected, json::parse(reply.body));
+  EXPECT_EQ(expected, parsedJson(reply.body));
 }
 
 TEST(HealthRoute, CountsWatchers) {
@@ -46,7 +46,7 @@ TEST(TablesRoute, DescribesTablesInTheOrderOfRegistration) {
   EXPECT_EQ("GATE", tables[1]["table"]);
   EXPECT_EQ("EVENTS", tables[2]["table"]);
   EXPECT_EQ("FAILS", tables[3]["table"]);
-  const json expected = json::parse(R"({"application":"TEST","table":"ECHO","row_bytes":200,"columns":[
+  const json expected = parsedJson(R"({"application":"TEST","table":"ECHO","row_bytes":200,"columns":[
       {"name":"TEXT","type":"character","width":64,"offset":0},
       {"name":"NUMBER","type":"integer","width":4,"offset":64},
       {"name":"BYTES","type":"character","width":128,"offset":68},
@@ -120,7 +120,7 @@ TEST(QueryRoute, ReadsBodiesThatComeInPieces) {
     ASSERT_TRUE(client.send(std::string("1\r\n") + c + "\r\n"));
   }
   ASSERT_TRUE(client.send("0\r\n\r\n"));
-  EXPECT_EQ("piecemeal", json::parse(client.receive().body)["rows"][0]["TEXT"]);
+  EXPECT_EQ("piecemeal", parsedJson(client.receive().body)["rows"][0]["TEXT"]);
 }
 
 TEST(QueryRoute, ReadsABodyOfTheLargestSize) {
@@ -199,7 +199,7 @@ TEST(BadRequests, AreRefusedWithACodeAndASentence) {
     const HttpReply reply = client.request(bad.method, bad.path, bad.body);
     EXPECT_EQ(bad.status, reply.status);
     EXPECT_EQ("application/json", reply.headers.at("content-type"));
-    const json error = json::parse(reply.body);
+    const json error = parsedJson(reply.body);
     ASSERT_TRUE(error.is_object() && error.size() == 1 && error["error"].size() == 2) << reply.body;
     EXPECT_EQ(bad.code, error["error"]["code"]);
     EXPECT_THAT(error["error"]["message"].get<std::string>(), HasSubstr(bad.named));
@@ -324,7 +324,7 @@ TEST(Connections, ServeManyRequestsInOrder) {
   }
   ASSERT_TRUE(client.send(pipelined));
   for (int number = 0; number < 100; ++number) {
-    ASSERT_EQ(number, json::parse(client.receive().body)["rows"][0]["NUMBER"]);
+    ASSERT_EQ(number, parsedJson(client.receive().body)["rows"][0]["NUMBER"]);
   }
 }
 

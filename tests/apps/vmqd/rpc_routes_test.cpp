@@ -95,7 +95,7 @@ TEST(BadCalls, AreRefusedWithACodeAndASentence) {
     EXPECT_EQ(each.status, reply.status);
     EXPECT_EQ("application/json", reply.headers.at("content-type"));
     const json expected = {{"error", {{"code", each.code}, {"message", each.message}}}};
-    EXPECT_EQ(expected, json::parse(reply.body));
+    EXPECT_EQ(expected, parsedJson(reply.body));
   }
   EXPECT_EQ("POST", client.get(good).headers.at("allow"));
 }
@@ -112,8 +112,8 @@ TEST(Faults, AreToldWithTheirNumber) {
          "The call ended with the fault 0x1c000007: a count or an index in the packet does not fit, or the "
          "packet is shorter than its counts say."},
         {"status", 469762055}}}};
-  EXPECT_EQ(expected, json::parse(reply.body));
-  EXPECT_EQ(4294967295u, json::parse(callOperation(client, 1, "4294967295").body)["error"]["status"]);
+  EXPECT_EQ(expected, parsedJson(reply.body));
+  EXPECT_EQ(4294967295u, parsedJson(callOperation(client, 1, "4294967295").body)["error"]["status"]);
   EXPECT_THAT(callOperation(client, 1, "469762075").body, HasSubstr("0x1c00001b: there is no memory for the call."));
 }
 
@@ -122,7 +122,7 @@ TEST(Faults, AreWhatExceptionsBecome) {
   HttpClient client(daemon.socket());
   const HttpReply reply = callOperation(client, 2, "");
   EXPECT_EQ(422, reply.status);
-  EXPECT_EQ(0x1c000012, json::parse(reply.body)["error"]["status"]);
+  EXPECT_EQ(0x1c000012, parsedJson(reply.body)["error"]["status"]);
   EXPECT_EQ(200, callOperation(client, 0, "").status);
 }
 

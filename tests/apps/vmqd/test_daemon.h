@@ -1,13 +1,13 @@
 #pragma once
 // The daemon with the component of these tests, and what they say to it.
 
-#include <nlohmann/json.hpp>
 #include <string>
 #include <utility>
 #include <vector>
 
 #include "tests/support/daemon_fixture.h"
 #include "tests/support/http_client.h"
+#include "tests/support/json.h"
 
 /// A vmqd with the tables of test_component.cpp.
 class TestDaemon : public DaemonFixture {
@@ -16,21 +16,12 @@ class TestDaemon : public DaemonFixture {
       : DaemonFixture({"", VMQ_TEST_COMPONENT, std::move(lines), start}) {}
 
   /// The JSON of a reply to a request on a connection of its own. Throws when it is no JSON.
-  [[nodiscard]] nlohmann::json get(const std::string& path) const {
-    return nlohmann::json::parse(HttpClient(socket()).get(path).body);
-  }
-  [[nodiscard]] nlohmann::json query(const std::string& table, const std::string& predicates) const {
-    return nlohmann::json::parse(
-        HttpClient(socket()).post("/v1/tables/" + table + "/query", "{\"predicates\":" + predicates + "}").body);
-  }
+  [[nodiscard]] nlohmann::json get(const std::string& path) const;
+  [[nodiscard]] nlohmann::json query(const std::string& table, const std::string& predicates) const;
 };
 
 /// The code of an error reply; what the reply holds when it is none.
-inline std::string errorCode(const HttpReply& reply) {
-  const auto json = nlohmann::json::parse(reply.body, nullptr, /*allow_exceptions=*/false);
-  if (!json.is_object() || !json.contains("error")) return reply.body;
-  return json["error"]["code"].get<std::string>();
-}
+std::string errorCode(const HttpReply& reply);
 
 /// Calls an operation of the interface of test_component.cpp, as a little-endian client.
 inline HttpReply callOperation(HttpClient& client, int operation, const std::string& packet) {

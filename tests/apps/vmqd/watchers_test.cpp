@@ -95,7 +95,7 @@ TEST_F(WatchersTest, AreToldWhatTheyHaveLost) {
   while (seen + lost < sent) {
     const auto event = watcher.nextEvent();
     ASSERT_TRUE(event);
-    const json data = json::parse(event->data);
+    const json data = parsedJson(event->data);
     if (event->name == "lost") {
       lost += data["rows"].get<int>();
       ++gaps;
@@ -155,7 +155,7 @@ TEST(WatcherLimit, LeavesRoomForQueries) {
   const HttpReply reply = fourth.watch(events);
   EXPECT_EQ(503, reply.status);
   EXPECT_EQ("busy", errorCode(reply));
-  EXPECT_EQ(3, json::parse(fourth.get("/v1/health").body)["watchers"]);
+  EXPECT_EQ(3, parsedJson(fourth.get("/v1/health").body)["watchers"]);
 }
 
 TEST(ConnectionLimit, IsToldToThoseBeyondIt) {
@@ -186,7 +186,7 @@ TEST(ManyClients, AreServedAtATime) {
         const int number = client * 1000 + request;
         const HttpReply reply =
             connection.post("/v1/tables/ECHO/query", R"({"predicates":{"NUMBER":)" + std::to_string(number) + "}}");
-        if (json::parse(reply.body)["rows"][0]["NUMBER"] == number) ++right;
+        if (parsedJson(reply.body)["rows"][0]["NUMBER"] == number) ++right;
       }
     });
   }
@@ -218,7 +218,7 @@ TEST(BlockedQueries, HoldUpNobodyElse) {
   Gate gate(daemon.directory() / "gate");
   HttpClient blocked(daemon.socket());
   std::thread asking([&] {
-    EXPECT_EQ("passed", json::parse(blocked.post("/v1/tables/GATE/query", gate.query()).body)["rows"][0]["TEXT"]);
+    EXPECT_EQ("passed", parsedJson(blocked.post("/v1/tables/GATE/query", gate.query()).body)["rows"][0]["TEXT"]);
   });
   gate.waitForQuery();
   EXPECT_EQ(200, HttpClient(daemon.socket()).get("/v1/health").status);
