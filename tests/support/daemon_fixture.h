@@ -11,8 +11,8 @@
 class DaemonFixture {
  public:
   struct Options {
-    std::string home;                ///< an existing installation home; empty: one in the scratch directory with nothing but "tmp"
-    std::string library;             ///< the component; empty: the project's own
+    std::string home;     ///< an existing installation home; empty: one in the scratch directory with nothing but "tmp"
+    std::string library;  ///< the component; empty: the project's own
     std::vector<std::string> lines;  ///< further lines of the configuration file
     bool start = true;
   };

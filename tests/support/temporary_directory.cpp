@@ -32,8 +32,8 @@ std::string TemporaryDirectory::writeFile(const std::string& name, const std::st
 
 std::string TemporaryDirectory::writeScript(const std::string& name, const std::string& body) const {
   const std::string file = writeFile(name, "#!/bin/sh\n" + body);
-  fs::permissions(file, fs::perms::owner_all | fs::perms::group_read | fs::perms::group_exec |
-                            fs::perms::others_read | fs::perms::others_exec);
+  fs::permissions(file, fs::perms::owner_all | fs::perms::group_read | fs::perms::group_exec | fs::perms::others_read |
+                            fs::perms::others_exec);
   return file;
 }
 

@@ -273,9 +273,8 @@ TEST(Mismatches, AreFound) {
             api.mismatch(parsedJson(R"({"status":"ok","uptime_seconds":1,"watchers":"0"})"), api.schema("Health")));
   EXPECT_EQ("$.status is none of the values listed",
             api.mismatch(parsedJson(R"({"status":"bad","uptime_seconds":1,"watchers":0})"), api.schema("Health")));
-  EXPECT_EQ(
-      "$ has an undescribed member x",
-      api.mismatch(parsedJson(R"({"status":"ok","uptime_seconds":1,"watchers":0,"x":1})"), api.schema("Health")));
+  EXPECT_EQ("$ has an undescribed member x",
+            api.mismatch(parsedJson(R"({"status":"ok","uptime_seconds":1,"watchers":0,"x":1})"), api.schema("Health")));
   EXPECT_EQ("$.rows[0].A is 0 of the choices",
             api.mismatch(parsedJson(R"({"table":"T","rows":[{"A":null}]})"), api.schema("Rows")));
 }

@@ -1,5 +1,6 @@
 // A component for the daemon's tests: tables that do what a test tells them to, all with the same columns.
-//   ECHO   answers with COUNT rows (one without it) that repeat the query's TEXT, numbered by NUMBER from 0 (or with the
+//   ECHO   answers with COUNT rows (one without it) that repeat the query's TEXT, numbered by NUMBER from 0 (or with
+//   the
 //          query's NUMBER when there is no COUNT); BYTES tells what TEXT asks for, see tell()
 //   GATE   opens the FIFO named by BYTES for reading, waits for its end and answers with one row
 //   EVENTS a query sends COUNT events, numbered by NUMBER, with its TEXT; whatever is open on the table gets those that
