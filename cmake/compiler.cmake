@@ -1,4 +1,4 @@
-# One place for the language level, the warnings, the sanitizers and the counters of every target.
+# One place for the language level, the warnings and the sanitizers of every target.
 set(CMAKE_CXX_STANDARD 20)
 set(CMAKE_CXX_STANDARD_REQUIRED ON)
 set(CMAKE_CXX_EXTENSIONS OFF)
@@ -22,14 +22,6 @@ if(VMQ_SANITIZE)
   add_link_options(-fsanitize=${VMQ_SANITIZE})
 else()
   add_compile_options(-fstack-protector-strong)
-endif()
-if(VMQ_COVERAGE)
-  # The counters of several threads add up, and those of a child that shares its parent's memory are the parent's. A
-  # program that runs as another user may not write its counters, and says so where GCOV_ERROR_FILE of the tests' preset
-  # tells it to.
-  add_compile_options(--coverage -fprofile-abs-path -fprofile-update=atomic)
-  add_compile_definitions(VMQ_COVERAGE)
-  add_link_options(--coverage)
 endif()
 include_directories(${PROJECT_SOURCE_DIR})
 
