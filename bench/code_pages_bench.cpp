@@ -72,6 +72,7 @@ void narrowByThePlainLoop(benchmark::State& state) {
 }
 
 void toUtf16(benchmark::State& state, int32_t code_page, const std::string& text) {
+  // NOLINTNEXTLINE(readability-suspicious-call-argument): the first is what the second is
   NLS2_Locale* const locale = NLS2_GetLocale(NLS2_BY_CODEPAGE, code_page);
   std::vector<unsigned short> units(text.size());
   const auto count = static_cast<uint32_t>(text.size());
@@ -85,6 +86,7 @@ void toUtf16(benchmark::State& state, int32_t code_page, const std::string& text
 }
 
 void fromUtf16(benchmark::State& state, int32_t code_page) {
+  // NOLINTNEXTLINE(readability-suspicious-call-argument): the first is what the second is
   NLS2_Locale* const locale = NLS2_GetLocale(NLS2_BY_CODEPAGE, code_page);
   const std::vector<unsigned short> units(static_cast<size_t>(state.range(0)), 'x');
   std::vector<char> bytes(units.size() + 1);

@@ -32,12 +32,15 @@ class Daemon {
     (void)process_.stop();
     std::filesystem::remove_all(directory_);
   }
+  Daemon(const Daemon&) = delete;
+  Daemon& operator=(const Daemon&) = delete;
   [[nodiscard]] std::string socket() const { return directory_ + "/s"; }
   /// A line of /proc/PID/status, in kB.
   [[nodiscard]] double kilobytes(const std::string& name) const {
     std::ifstream status("/proc/" + std::to_string(process_.pid()) + "/status");
     for (std::string line; std::getline(status, line);) {
-      if (line.compare(0, name.size() + 1, name + ":") == 0) return std::atof(line.c_str() + name.size() + 1);
+      if (line.compare(0, name.size() + 1, name + ":") == 0)
+        return std::strtod(line.c_str() + name.size() + 1, nullptr);
     }
     throw std::runtime_error("no " + name);
   }
@@ -74,7 +77,7 @@ class Connection {
   Connection& operator=(const Connection&) = delete;
 
   /// Microseconds until the whole reply has come; `bytes` of it come in one piece, as the server writes it.
-  double roundTrip(const std::string& request, size_t bytes) {
+  [[nodiscard]] double roundTrip(const std::string& request, size_t bytes) const {
     char reply[16384];
     const auto begin = Clock::now();
     if (send(descriptor_, request.data(), request.size(), 0) < 0) throw std::runtime_error("send");
@@ -87,7 +90,7 @@ class Connection {
     return std::chrono::duration<double, std::micro>(Clock::now() - begin).count();
   }
   /// The reply to a request that is answered in one piece.
-  std::string ask(const std::string& request) {
+  [[nodiscard]] std::string ask(const std::string& request) const {
     char reply[16384];
     if (send(descriptor_, request.data(), request.size(), 0) < 0) throw std::runtime_error("send");
     const ssize_t count = recv(descriptor_, reply, sizeof reply, 0);
@@ -119,7 +122,7 @@ double quantile(std::vector<double>& values, double part) {
 void KagreqtAgainstEmptyRoundTrip(benchmark::State& state) {
   const Daemon daemon;
   const double idle = daemon.kilobytes("VmRSS");
-  Connection connection(daemon.socket());
+  const Connection connection(daemon.socket());
   const std::string query = queryRequest();
   if (connection.ask(query).find("VMQ1006E") == std::string::npos)
     return state.SkipWithError("not the expected answer");

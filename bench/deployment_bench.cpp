@@ -44,6 +44,8 @@ constexpr char kHeader[] = "\"ProdCode\",\"Description\",\"Platform\",\"Version\
 /// The component of this process on a scratch home with its tools.
 class Component {
  public:
+  Component(const Component&) = delete;
+  Component& operator=(const Component&) = delete;
   static Component& get() {
     static Component component;
     return component;

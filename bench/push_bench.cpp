@@ -66,7 +66,7 @@ double cpuSecondsIn(const rusage& usage) {
 double peakKilobytes(pid_t pid) {
   std::ifstream status("/proc/" + std::to_string(pid) + "/status");
   for (std::string line; std::getline(status, line);) {
-    if (line.rfind("VmHWM:", 0) == 0) return std::atof(line.c_str() + 6);
+    if (line.rfind("VmHWM:", 0) == 0) return std::strtod(line.c_str() + 6, nullptr);
   }
   return 0;
 }
@@ -122,19 +122,21 @@ class Scene {
     (void)process_.stop();
     fs::remove_all(directory_);
   }
+  Scene(const Scene&) = delete;
+  Scene& operator=(const Scene&) = delete;
   [[nodiscard]] std::string path(const std::string& name) const { return (directory_ / name).string(); }
 
-  Cost push() const {
+  [[nodiscard]] Cost push() const {
     return withDaemon([&] { return run(pushArguments()); });
   }
-  double clientPeakKilobytes() const { return peakKilobytesOf(pushArguments()); }
+  [[nodiscard]] double clientPeakKilobytes() const { return peakKilobytesOf(pushArguments()); }
   /// Holes are written out, and nothing is shared: what a transfer has to do as well.
-  Cost copy() const {
+  [[nodiscard]] Cost copy() const {
     setAside("copy");
     return run({"cp", "-r", "--sparse=never", "--reflink=never", path("files"), path("copy")});
   }
   /// The packets of a push, made and sent as vmqctl does, to an operation that does not exist.
-  Cost postToNothing() const {
+  [[nodiscard]] Cost postToNothing() const {
     return withDaemon([&] {
       rusage before = {}, after = {};
       (void)getrusage(RUSAGE_SELF, &before);  // cannot fail
@@ -154,17 +156,17 @@ class Scene {
     static int number = 0;
     fs::rename(path(name), path("aside" + std::to_string(++number)));
   }
-  std::vector<std::string> pushArguments() const {
+  [[nodiscard]] std::vector<std::string> pushArguments() const {
     setAside("depot/files");
     return {VMQ_CLIENT, "push", path("files"), "--socket", path("s")};
   }
-  Cost withDaemon(const std::function<Cost()>& work) const {
+  [[nodiscard]] Cost withDaemon(const std::function<Cost()>& work) const {
     const double before = daemonCpuSeconds();
     Cost cost = work();
     cost.daemonCpuSeconds = daemonCpuSeconds() - before;
     return cost;
   }
-  double daemonCpuSeconds() const {
+  [[nodiscard]] double daemonCpuSeconds() const {
     std::ifstream stat("/proc/" + std::to_string(process_.pid()) + "/stat");
     std::string word;
     for (int field = 1; field < 14; ++field) stat >> word;  // "(vmqd)" is one word
@@ -202,7 +204,7 @@ class Scene {
     }
   }
 
-  std::string configuration() const {
+  [[nodiscard]] std::string configuration() const {
     fs::create_directories(directory_ / "home/tmp");
     fs::create_directories(directory_ / "depot");
     fs::create_directories(directory_ / "files");
@@ -259,7 +261,8 @@ void compare(benchmark::State& state, const Scene& scene, double bytes) {
 
 void PushOfOneLargeFile(benchmark::State& state) {
   const char* const mebibytes = std::getenv("VMQ_PUSH_BENCH_MIB");
-  const auto bytes = static_cast<std::uintmax_t>(mebibytes != nullptr ? std::atoll(mebibytes) : 1024) * 1024 * 1024;
+  const auto bytes =
+      static_cast<std::uintmax_t>(mebibytes != nullptr ? std::strtoll(mebibytes, nullptr, 10) : 1024) * 1024 * 1024;
   const Scene scene;
   std::ofstream(scene.path("files/large")).flush();
   fs::resize_file(scene.path("files/large"), bytes);
@@ -269,7 +272,7 @@ BENCHMARK(PushOfOneLargeFile)->UseManualTime()->Iterations(3)->Unit(benchmark::k
 
 void PushOfAThousandSmallFiles(benchmark::State& state) {
   constexpr int files = 1000;
-  const std::string text(10 * 1024, 'x');
+  const std::string text(std::size_t{10} * 1024, 'x');
   const Scene scene;
   for (int i = 0; i < files; ++i) std::ofstream(scene.path("files/" + std::to_string(i))) << text;
   compare(state, scene, static_cast<double>(files * text.size()));

@@ -35,7 +35,7 @@ std::vector<std::string> wordsOf(std::string line) {
 }  // namespace
 
 int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-  const std::string line = std::string(reinterpret_cast<const char*>(data), size).c_str();
+  const std::string line = fuzz::upToNull(data, size);
   const VMQ::String command(line.c_str());
   char** argv = nullptr;
   const char count = VMQ::MakeArgv(&command, &argv);

@@ -26,7 +26,7 @@ bool canBeDumped(DOMElement& element) {
     const std::string value = String(attribute.getValue()).toNarrow();
     if (!isAscii(attribute.getName()) || value.find_first_of("<&\"\t\r\n") != std::string::npos) return false;
   }
-  for (DOMNode* const child : *element.getChildren()) {
+  for (DOMNode* const child : *element.getChildren()) {  // NOLINT(readability-use-anyofallof): it has not the iterators
     if (!canBeDumped(static_cast<DOMElement&>(*child))) return false;
   }
   return true;

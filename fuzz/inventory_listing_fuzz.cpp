@@ -46,7 +46,7 @@ Fields fieldsOf(const InventoryRecord& record) {
 }  // namespace
 
 int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-  const std::string listing = std::string(reinterpret_cast<const char*>(data), size).c_str();
+  const std::string listing = fuzz::upToNull(data, size);
   for (const InventoryFields mode : {InventoryFields::kExactlyFive, InventoryFields::kAtLeastFive}) {
     const auto expected = recordsOf(listing, mode == InventoryFields::kExactlyFive);
     for (size_t wanted = 0; wanted <= expected.size(); wanted += std::max<size_t>(expected.size(), 1)) {

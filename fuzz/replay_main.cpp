@@ -15,7 +15,7 @@ namespace {
 /// From memory that ends with the file, so that a sanitizer sees who reads on.
 void replay(const std::filesystem::path& file) {
   std::printf("%s\n", file.c_str());
-  std::fflush(stdout);
+  (void)std::fflush(stdout);
   std::ifstream stream(file, std::ios::binary);
   const std::vector<uint8_t> input{std::istreambuf_iterator<char>(stream), std::istreambuf_iterator<char>()};
   fuzz::require(!stream.bad(), "the file can be read");

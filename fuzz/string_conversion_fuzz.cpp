@@ -10,7 +10,7 @@
 using VMQ::String;
 
 int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-  const std::string bytes = std::string(reinterpret_cast<const char*>(data), size).c_str();
+  const std::string bytes = fuzz::upToNull(data, size);
   const String text(bytes.c_str());
   fuzz::require(text.toNarrow() == bytes, "in the plain locale every byte comes back");
   fuzz::require(String(bytes.c_str(), static_cast<unsigned>(size / 2)).toNarrow() == bytes.substr(0, size / 2),

@@ -21,6 +21,11 @@ void require(bool holds, const char* promise) {
   std::abort();
 }
 
+std::string upToNull(const uint8_t* data, size_t size) {
+  const std::string_view input(reinterpret_cast<const char*>(data), size);
+  return std::string(input.substr(0, input.find('\0')));
+}
+
 uint8_t Input::byte() {
   const std::string_view one = take(1);
   return one.empty() ? 0 : static_cast<uint8_t>(one[0]);

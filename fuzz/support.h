@@ -31,6 +31,9 @@ bool happens(bool valid, Operation operation) {
   return valid;
 }
 
+/// The input as far as C reads it, to its first null.
+std::string upToNull(const uint8_t* data, size_t size);
+
 /// Takes an input apart. Behind its end come zeros and empty texts.
 class Input {
  public:

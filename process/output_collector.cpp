@@ -18,7 +18,8 @@ constexpr int kReadsPerDrain = 64;  // 1 MiB, the most that an ordinary user's p
 OutputCollector::OutputCollector(ProcessInputStream& stream, String& text, const char* name)
     : stream_(stream), text_(text), name_(name), buffer_(new char[kReadBytes + 1]) {
   const Trace trace(traceUnit);
-  ended_ = !stream_.setNonBlocking();  // a read that might wait for ever is worse than none
+  // A read that might wait for ever is worse than none.
+  ended_ = !stream_.setNonBlocking();  // NOLINT(cppcoreguidelines-prefer-member-initializer): within the trace
 }
 
 bool OutputCollector::readOnce() {

@@ -17,7 +17,7 @@ RAS1_Unit traceUnit{"process/process_streams"};
 
 }  // namespace
 
-bool ProcessStream::setNonBlocking() {
+bool ProcessStream::setNonBlocking() {  // NOLINT(readability-make-member-function-const): see its declaration
   const Trace trace(traceUnit);
   const int flags = fcntl(descriptor_, F_GETFL);
   if (flags >= 0 && fcntl(descriptor_, F_SETFL, flags | O_NONBLOCK) == 0) return true;

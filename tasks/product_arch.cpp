@@ -129,7 +129,7 @@ String getProductArchDir(const String& arch, const String& productCode) {
 String getSharedLibArchDir() {
   const Trace trace(traceUnit);
   const String arch = getSharedLibArch("ax", getSharedLibArch("ux", ""));
-  const String directory = arch.length() == 0 ? String() : architectureDirectory(arch, "bin");
+  String directory = arch.length() == 0 ? String() : architectureDirectory(arch, "bin");
   TRACE_DETAIL(trace, "Architecture directory for Shared Lib [%s] is is [%s]", arch.c_str().get(),
                directory.c_str().get());
   return directory;

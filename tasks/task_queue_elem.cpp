@@ -57,6 +57,7 @@ void TaskQueueElem::ReturnStatus(int rc) {
   fillColumn(row.targetmsn, targetmsn);
 }
 
+// NOLINTNEXTLINE(readability-make-member-function-const): the interface
 void TaskQueueElem::returnAsyncStatus(int rc) {
   const Trace trace(traceUnit);
   TRACE_DETAIL(trace, "Returning aysnc status return code [%d], message id [%s] parms [%s]", rc, retmsgid.c_str().get(),
@@ -78,7 +79,7 @@ void TaskQueueElem::SetValueAndPad(char* dst, unsigned long size, const char* sr
   const Trace trace(traceUnit);
   const size_t length = std::strlen(src);
   if (length <= size) {
-    std::memcpy(dst, src, length);
+    std::memcpy(dst, src, length);  // NOLINT(bugprone-not-null-terminated-result): blanks fill a column
     std::memset(dst + length, ' ', size - length);
     return;
   }

@@ -58,6 +58,7 @@ String askForInstance(const Trace& trace, const String& productCode, const Strin
 
 }  // namespace
 
+// NOLINTNEXTLINE(cert-err58-cpp): without that little memory the host had better not load the component
 const CommandReport TRANSLATOR_REPORT = translatorReport(/*with_standard_error=*/false);
 
 bool getTwoWayTranslator(String& translator) {

@@ -68,6 +68,7 @@ int openTarget(const std::string& path, bool& isNew) {
   constexpr mode_t mode = 0666;
   const int created = open(path.c_str(), flags | O_EXCL, mode);
   isNew = created >= 0;
+  // cppcheck-suppress resourceLeak ; it is returned
   return isNew || errno != EEXIST ? created : open(path.c_str(), flags, mode);
 }
 

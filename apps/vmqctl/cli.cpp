@@ -42,7 +42,7 @@ std::optional<std::string> parseCommandLine(int argc, const char* const* argv, I
         "--timeout SECONDS", result.settings.timeoutSeconds, {0, UINT_MAX, " of seconds"},
         "How long to wait altogether; 0 for no limit (default: " + std::to_string(each.defaultTimeoutSeconds) + ")");
   }
-  if (const std::optional<std::string> text = line.parse(argc, argv)) return text;
+  if (std::optional<std::string> text = line.parse(argc, argv)) return text;
 
   result.settings.format = format == "json" ? Format::AsJson : Format::AsTable;
   const DeclaredVerb& typed = verbs.named(line.typedVerb());

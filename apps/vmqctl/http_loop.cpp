@@ -18,12 +18,14 @@ void check(Code code) {
 }
 
 constexpr std::size_t sentUnasked = std::size_t{64} * 1024;  // less than a socket takes at once
-constexpr long uploadBufferBytes = 256 * 1024;
+constexpr long uploadBufferBytes = long{256} * 1024;
 
 /// Sets the library up once; it is told to leave when the process ends.
 struct Library {
   Library() { check(curl_global_init(CURL_GLOBAL_DEFAULT)); }
   ~Library() { curl_global_cleanup(); }
+  Library(const Library&) = delete;
+  Library& operator=(const Library&) = delete;
 };
 
 CURLM* makeMulti() {

@@ -2,8 +2,6 @@
 
 #include "apps/vmqctl/messages.h"
 
-#include <algorithm>
-
 namespace vmqctl {
 
 // clang-format off
@@ -83,8 +81,10 @@ const std::array<Message, 35> messages = {{
 // clang-format on
 
 const Message* findMessage(std::string_view id) {
-  const auto found = std::find_if(messages.begin(), messages.end(), [&](const Message& m) { return m.id == id; });
-  return found == messages.end() ? nullptr : &*found;
+  for (const Message& message : messages) {
+    if (message.id == id) return &message;
+  }
+  return nullptr;
 }
 
 std::string_view messageIdOf(long returnValue) {

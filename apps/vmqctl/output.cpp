@@ -84,6 +84,7 @@ std::string plain(const Json& value) {
 
 std::string table(const std::vector<std::string>& names, const std::vector<Json>& rows, const Layout& layout) {
   std::vector<Column> columns;
+  columns.reserve(names.size());
   for (const std::string& name : names) columns.push_back(makeColumn(name, rows, layout.charset));
 
   if (layout.width != 0 && !shrink(columns, layout.width)) {

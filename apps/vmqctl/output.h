@@ -20,10 +20,10 @@ struct Layout {
 /// What fits this stream.
 Layout layoutFor(const Stream& stream);
 
-/// Rows (JSON objects) below the names of `columns`, numbers to the right. Each row is one line: control characters are
-/// escaped. In a limited width long texts are cut and end in "..."; when not even the names fit, each row is written as
-/// one COLUMN VALUE line for each column, and nothing is cut.
-std::string table(const std::vector<std::string>& columns, const std::vector<Json>& rows, const Layout& layout);
+/// Rows (JSON objects) below `names`, those of their columns, numbers to the right. Each row is one line: control
+/// characters are escaped. In a limited width long texts are cut and end in "..."; when not even the names fit, each
+/// row is written as one COLUMN VALUE line for each column, and nothing is cut.
+std::string table(const std::vector<std::string>& names, const std::vector<Json>& rows, const Layout& layout);
 
 /// Names and values below each other. Long values go on in the next line when the width is limited.
 std::string record(const Json& object, const Layout& layout);

@@ -17,7 +17,7 @@ struct Operator {
 // The longer sign before the one that it begins with.
 constexpr Operator operators[] = {{"!=", "ne"}, {"<=", "le"}, {">=", "ge"}, {"=", "eq"}, {"<", "lt"}, {">", "gt"}};
 
-const std::string unreserved = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789-._~";
+constexpr std::string_view unreserved = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789-._~";
 
 std::string encoded(std::string_view text, std::string_view plain) {
   constexpr std::string_view digits = "0123456789ABCDEF";
@@ -81,7 +81,7 @@ std::string percentEncoded(std::string_view text) {
 }
 
 std::string percentEncodedPath(std::string_view path) {
-  return encoded(path, unreserved + "/");
+  return encoded(path, std::string(unreserved) + "/");
 }
 
 std::string toQueryString(const Predicates& predicates) {

@@ -20,9 +20,9 @@ Session::Session(const Console& theConsole, const Settings& settings, unsigned d
 
 std::string socketPath(const Settings& settings) {
   const char* fromEnvironment = std::getenv("VMQ_SOCKET");
-  const std::string path = !settings.socket.empty()                                 ? settings.socket
-                           : fromEnvironment != nullptr && *fromEnvironment != '\0' ? fromEnvironment
-                                                                                    : defaultSocket;
+  std::string path = !settings.socket.empty()                                 ? settings.socket
+                     : fromEnvironment != nullptr && *fromEnvironment != '\0' ? fromEnvironment
+                                                                              : defaultSocket;
   constexpr std::size_t room = sizeof(sockaddr_un::sun_path);
   if (path.size() >= room) {
     throw Failure(ExitCode::Usage, "The path of the socket is too long: " + path + ".",

@@ -6,6 +6,7 @@
 #include <clocale>
 #include <cstdio>
 #include <cwchar>
+#include <iterator>
 
 namespace vmqctl {
 namespace {
@@ -48,10 +49,8 @@ bool misleads(char32_t code) {
       {0xFFF9, 0xFFFB},    // annotations
       {0xE0000, 0xE007F},  // tags
   };
-  for (const Range& range : ranges) {
-    if (code >= range.first && code <= range.last) return true;
-  }
-  return false;
+  return std::any_of(std::begin(ranges), std::end(ranges),
+                     [code](const Range& range) { return code >= range.first && code <= range.last; });
 }
 
 int columns(char32_t code) {

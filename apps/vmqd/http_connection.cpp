@@ -73,8 +73,8 @@ HttpConnection::HttpConnection(HttpServer& server, MHD_Connection* connection)
       connection_(connection),
       descriptor_(descriptorOf(connection)),
       open_(server.connections_),
-      deadline_(server.deadlines_, descriptor_) {
-  one_too_many_ = server_.connections_.count() > server_.limits_.maximum_connections;
+      deadline_(server.deadlines_, descriptor_),
+      one_too_many_(server.connections_.count() > server.limits_.maximum_connections) {
   const auto peer = peerOf(descriptor_);
   admitted_ = peer && server_.users_.admits(peer->uid);
   if (!peer) {

@@ -19,6 +19,7 @@ class HttpConnection {
  public:
   /// `connection` was accepted just now.
   HttpConnection(HttpServer& server, MHD_Connection* connection);
+  ~HttpConnection() = default;
   HttpConnection(const HttpConnection&) = delete;
   HttpConnection& operator=(const HttpConnection&) = delete;
 
@@ -44,7 +45,7 @@ class HttpConnection {
   const Activity::Scope open_;
   ClientDeadlines::Client deadline_;
   bool admitted_ = false;
-  bool one_too_many_ = false;
+  const bool one_too_many_;
   bool unfinished_ = false;
   size_t maximum_bytes_ = 0;                  // of this request's body
   std::optional<PacketMemory::Share> share_;  // when the body is a packet and there was room for it

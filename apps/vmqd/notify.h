@@ -13,7 +13,7 @@ class ServiceManager {
   ServiceManager();
 
   /// Sends "READY=1" or the like. Returns 0, or an errno value: the service manager may have gone.
-  int notify(std::string_view state) const;
+  [[nodiscard]] int notify(std::string_view state) const;
 
  private:
   std::string socket_;  ///< a path, or "@NAME" in the abstract name space; empty without a service manager

@@ -18,6 +18,8 @@ class PacketMemory {
   class Share {
    public:
     Share(PacketMemory& memory, size_t bytes) : memory_(&memory), bytes_(bytes) {}
+    Share(const Share&) = delete;
+    Share& operator=(const Share&) = delete;
     Share(Share&& other) noexcept : memory_(std::exchange(other.memory_, nullptr)), bytes_(other.bytes_) {}
     Share& operator=(Share&& other) noexcept {
       std::swap(memory_, other.memory_);

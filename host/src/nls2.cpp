@@ -26,15 +26,15 @@ using vmqhost::Converter;
 
 struct CodePage {
   int32_t id;
-  const char* name;  // as iconv knows it; null: converted here
   uint32_t maximumBytesPerUnit;
+  const char* name;  // as iconv knows it; null: converted here
 };
 
 /// 943 goes by the table of 932, which has all its characters: the C library's own table for 943 exchanges some control
 /// characters, which no text here means.
 constexpr CodePage kCodePages[] = {
-    {NLS2_CP_ASCII, nullptr, 1}, {NLS2_CP_LATIN1, nullptr, 1}, {NLS2_CP_UTF8, nullptr, 3},
-    {NLS2_CP932, "CP932", 2},    {NLS2_CP943, "CP932", 2},     {NLS2_CP_EUCJP, "EUC-JP", 3},
+    {NLS2_CP_ASCII, 1, nullptr}, {NLS2_CP_LATIN1, 1, nullptr}, {NLS2_CP_UTF8, 3, nullptr},
+    {NLS2_CP932, 2, "CP932"},    {NLS2_CP943, 2, "CP932"},     {NLS2_CP_EUCJP, 3, "EUC-JP"},
 };
 
 /// What nl_langinfo calls them.

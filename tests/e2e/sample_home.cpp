@@ -95,7 +95,7 @@ bool isRunning(pid_t pid) {
 }
 
 bool soon(const std::function<bool()>& question) {
-  for (int tries = 0; tries < 1000; ++tries) {
+  for (int tries = 0; tries < 3000; ++tries) {
     if (question()) return true;
     std::this_thread::sleep_for(std::chrono::milliseconds(10));
   }

@@ -125,9 +125,6 @@ bool EveryFault::commandSurvives(const FailingFunction& function, int nth) {
     awaitReports(fault);
     failed = fault.happened();
   }
-  if (failed) {
-    for (const std::string& line : trace_.texts(RAS1_ERROR)) told_[function.name].insert(line);
-  }
   EXPECT_TRUE(answers_.size() == 1 || (answers_.empty() && failed && mayLoseAnswer(function)))
       << answers_.size() << " answers";
   const auto answers = answers_;
@@ -142,6 +139,10 @@ bool EveryFault::commandSurvives(const FailingFunction& function, int nth) {
   if (!reports_.empty()) {
     EXPECT_EQ(reports_.back().retval, 0);
     reports_.pop_back();
+  }
+  // Not before: the command may have gone on after its fault had struck.
+  if (failed) {
+    for (const std::string& line : trace_.texts(RAS1_ERROR)) told_[function.name].insert(line);
   }
   answers_ = answers;
   checkAnswer(function, failed);

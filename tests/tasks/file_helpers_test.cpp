@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "test_seam.h"
+#include "tests/support/eventually.h"
 #include "tests/support/open_files.h"
 #include "tests/support/system_faults.h"
 #include "tests/support/temporary_directory.h"
@@ -122,7 +123,9 @@ TEST_F(TaskFiles, ProgramsDoNotGetAFileThatIsRead) {
   const std::string file = directory / "pipe";
   ASSERT_EQ(mkfifo(file.c_str(), 0600), 0);
   std::thread reading([&] { EXPECT_EQ(readFile(text(file)).toNarrow(), "text"); });
-  const int other_end = open(file.c_str(), O_WRONLY | O_CLOEXEC);  // once the reader's is open
+  const int other_end = open(file.c_str(), O_WRONLY | O_CLOEXEC);
+  // The reader's is open then, but may not have its number yet.
+  EXPECT_TRUE(eventually([&] { return descriptorsOf(file).size() == 2; }));
   const std::vector<int> ends = descriptorsOf(file);
   EXPECT_EQ(ends.size(), 2u);
   for (const int end : ends) EXPECT_TRUE(isClosedOnExec(end));

@@ -63,7 +63,7 @@ std::string ownName(const std::string& source) {
   fs::path path = fs::absolute(source, error).lexically_normal();
   if (error) refuseUnreadable(source, error.value());
   if (!path.has_filename()) path = path.parent_path();
-  const std::string name = path.filename().string();
+  std::string name = path.filename().string();
   if (name.empty()) refuse(source + " has no name of its own.", "Name what is in it.");
   return name;
 }
@@ -129,11 +129,13 @@ void PushPlan::addFile(const std::string& source, const std::string& name, std::
   bytes_ += bytes;
 }
 
-void PushPlan::addFolder(const std::string& source, const std::string& name) {
+void PushPlan::addFolder(const std::string& source, const std::string& folder) {
   const std::vector<std::string> entries = namesIn(source);
   if (entries.empty()) emptyFolders_.push_back(source);
   for (const std::string& entry : entries) {
-    const std::string path = source.back() == '/' ? source + entry : source + "/" + entry;
+    std::string path = source;
+    if (path.back() != '/') path += '/';
+    path += entry;
     const bool link = isLink(path);
     struct stat found = {};
     if (stat(path.c_str(), &found) != 0) {
@@ -141,9 +143,9 @@ void PushPlan::addFolder(const std::string& source, const std::string& name) {
       refuseUnreadable(path, errno);
     }
     if (S_ISREG(found.st_mode)) {
-      addFile(path, joined(name, entry), static_cast<std::uint64_t>(found.st_size));
+      addFile(path, joined(folder, entry), static_cast<std::uint64_t>(found.st_size));
     } else if (S_ISDIR(found.st_mode) && !link) {
-      addFolder(path, joined(name, entry));
+      addFolder(path, joined(folder, entry));
     } else if (S_ISDIR(found.st_mode)) {
       // It may lead back to where it is.
       refuse(path + " is a link to a folder.", "Put the folder itself in its place.");

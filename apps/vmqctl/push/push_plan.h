@@ -42,7 +42,7 @@ class PushPlan {
 
  private:
   void addFile(const std::string& source, const std::string& name, std::uint64_t bytes);
-  void addFolder(const std::string& source, const std::string& name);
+  void addFolder(const std::string& source, const std::string& folder);
 
   std::vector<PlannedFile> files_;
   std::uint64_t bytes_ = 0;

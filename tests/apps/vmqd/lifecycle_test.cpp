@@ -166,7 +166,7 @@ TEST(Stop, IsCleanOnEitherSignal) {
 }
 
 TEST(Stop, EndsOpenStreams) {
-  TestDaemon daemon;
+  TestDaemon daemon({"stop_seconds = 3600"});
   std::vector<std::unique_ptr<HttpClient>> watchers;
   for (int count = 0; count < 10; ++count) {
     watchers.push_back(std::make_unique<HttpClient>(daemon.socket()));
@@ -175,7 +175,7 @@ TEST(Stop, EndsOpenStreams) {
   }
   const auto begin = steady_clock::now();
   EXPECT_EQ(0, daemon.stop());
-  EXPECT_LT(steady_clock::now() - begin, std::chrono::seconds(5));
+  EXPECT_LT(steady_clock::now() - begin, std::chrono::seconds(30));
   for (const auto& watcher : watchers) EXPECT_EQ(std::nullopt, watcher->nextEvent());
 }
 

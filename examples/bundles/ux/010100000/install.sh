@@ -52,7 +52,7 @@ platform=$(sed -n 's/^"ax","[^"]*","\([^"]*\)".*/\1/p' "$products" | head -n 1)
 program=$home/zlpqor6/$platform/ux/bin/prometheus-node-exporter
 mkdir -p "${program%/*}" || fail "cannot write in $home/zlpqor6"
 new=$program.new
-cp "$here/prometheus-node-exporter" "$new" && chmod 755 "$new" || fail "cannot copy the program"
+{ cp "$here/prometheus-node-exporter" "$new" && chmod 755 "$new"; } || fail "cannot copy the program"
 becomes "$program"
 
 if [ ! -e "$home/config/ux.config" ]; then
