@@ -1,5 +1,6 @@
 // The data agent's configuration file, against a plain reading of it. The file lies in memory.
 
+#include <algorithm>
 #include <map>
 #include <string>
 
@@ -15,7 +16,7 @@ constexpr char comment = '*';
 
 /// A zero byte ends the text.
 std::map<std::string, std::string> entriesOf(std::string text) {
-  text = text.substr(0, text.find('\0'));
+  text.resize(std::min(text.size(), text.find('\0')));
   std::map<std::string, std::string> entries;
   while (!text.empty()) {
     const size_t end = text.find('\n');

@@ -43,7 +43,7 @@ class Twins {
     const unsigned choice = input_.byte();
     return choice < 250 ? below(model_.size() + 3) : String::NPOS - (choice - 250);
   }
-  bool inRange(unsigned position, unsigned count) const {
+  [[nodiscard]] bool inRange(unsigned position, unsigned count) const {
     return count >= 1 && uint64_t{position} + count <= model_.size();
   }
 

@@ -17,7 +17,7 @@ namespace fuzz {
 
 void require(bool holds, const char* promise) {
   if (holds) return;
-  std::fprintf(stderr, "Broken promise: %s\n", promise);
+  (void)std::fprintf(stderr, "Broken promise: %s\n", promise);
   std::abort();
 }
 
