@@ -73,12 +73,12 @@ const char* verdict(const Aim& aim, double value) {
 bool print(const Results& results, const Row& row) {
   const std::optional<double> ours = valueOf(results, row.ours);
   const bool isAlone = row.baseline.benchmark.empty();
-  const std::optional<double> baseline = isAlone ? std::nullopt : valueOf(results, row.baseline);
-  if (!ours || (!isAlone && !baseline)) {
+  const std::optional<double> baseline = isAlone ? 1.0 : valueOf(results, row.baseline);  // alone it is judged as it is
+  if (!ours || !baseline) {
     std::printf("| %s | not measured | | | | |\n", row.what.c_str());
     return false;
   }
-  const double judged = isAlone ? *ours : *ours / *baseline;
+  const double judged = *ours / *baseline;
   char ratio[32] = "";
   if (!isAlone) (void)std::snprintf(ratio, sizeof ratio, "%.2f", judged);
   std::printf("| %s | %s | %s | %s | %s | %s |\n", row.what.c_str(), shown(results, row, row.ours, *ours).c_str(),

@@ -651,8 +651,7 @@ TEST_F(Deploy, TakesTheOptionsOfInstall) {
 }
 
 TEST_F(Deploy, WaitsForTheOutcomeOfTheInstall) {
-  Gate asked;
-  endRequestsWith(daemon_, asked, statusRow("t1", "INSTALL", 1031, "VMQ1031E", "/depot/ux/1/install.sh,3"));
+  endRequestsWith(daemon_, statusRow("t1", "INSTALL", 1031, "VMQ1031E", "/depot/ux/1/install.sh,3"));
   const VmqctlResult result =
       run({"deploy", directory_ / "bundle", "ux", "--version", "1", "--transid", "t1", "-o", "json"});
   EXPECT_EQ(result.code, 1);

@@ -47,7 +47,7 @@ class RequestTest : public testing::Test {
 };
 
 TEST_F(RequestTest, StartWaitsForItsStatusEvent) {
-  endRequestsWith(daemon_, asked_, statusRow("t1", "START"));
+  endRequestsWith(daemon_, statusRow("t1", "START"));
   const VmqctlResult result = start();
   EXPECT_EQ(result.code, 0);
   EXPECT_EQ(result.out,
@@ -145,7 +145,7 @@ TEST_F(RequestTest, RefusedRequestIsNotWaitedFor) {
 }
 
 TEST_F(RequestTest, FailedCommandIsExplained) {
-  endRequestsWith(daemon_, asked_, statusRow("t1", "START", 1024, "VMQ1024E", "/h/bin/CorvelAgent  -h /h start ux"));
+  endRequestsWith(daemon_, statusRow("t1", "START", 1024, "VMQ1024E", "/h/bin/CorvelAgent  -h /h start ux"));
   const VmqctlResult result = start();
   EXPECT_EQ(result.code, 1);
   EXPECT_EQ(result.out,
@@ -159,7 +159,7 @@ TEST_F(RequestTest, FailedCommandIsExplained) {
 
 // A restart whose stop failed and whose start succeeded.
 TEST_F(RequestTest, SuccessThatCarriesAMessageIsASuccessAndShowsIt) {
-  endRequestsWith(daemon_, asked_, statusRow("t1", "RESTART", 0, "VMQ1024E", "stop ux"));
+  endRequestsWith(daemon_, statusRow("t1", "RESTART", 0, "VMQ1024E", "stop ux"));
   const VmqctlResult result = run({"restart", "ux", "--transid", "t1"});
   EXPECT_EQ(result.code, 0);
   EXPECT_THAT(result.out, HasSubstr("RESTART  ux                  t1       done         0  VMQ1024E\n"));
@@ -167,12 +167,12 @@ TEST_F(RequestTest, SuccessThatCarriesAMessageIsASuccessAndShowsIt) {
 }
 
 TEST_F(RequestTest, HostileParametersAreShownEscaped) {
-  endRequestsWith(daemon_, asked_, statusRow("t1", "START", 1024, "VMQ1024E", R"(\u001b[2Jx\ny)"));
+  endRequestsWith(daemon_, statusRow("t1", "START", 1024, "VMQ1024E", R"(\u001b[2Jx\ny)"));
   EXPECT_THAT(start().err, HasSubstr("(parameters: \\x1b[2Jx\\ny)"));
 }
 
 TEST_F(RequestTest, JsonHoldsTheAnswerAndTheEvent) {
-  endRequestsWith(daemon_, asked_, statusRow("t1", "START", 1034, "VMQ1034E", "ux"));
+  endRequestsWith(daemon_, statusRow("t1", "START", 1034, "VMQ1034E", "ux"));
   const VmqctlResult result = run({"start", "ux", "--transid", "t1", "-o", "json", "--target", "m"});
   EXPECT_EQ(result.code, 1);
   EXPECT_EQ(result.out,
@@ -350,8 +350,7 @@ TEST_F(RequestTest, AnswersThatAreNotUnderstoodAreTold) {
 
 TEST_F(RequestTest, EventsThatAreNotUnderstoodAreTold) {
   for (const char* data : {"garbage", "{", "1", "{\"RETVAL\":null}"}) {
-    Gate asked;
-    endRequestsWith(daemon_, asked, data);
+    endRequestsWith(daemon_, data);
     const VmqctlResult result = start();
     EXPECT_EQ(result.code, 1) << data;
     EXPECT_THAT(result.err, testing::AnyOf(HasSubstr("is not understood"), HasSubstr("no number in RETVAL"))) << data;
@@ -443,7 +442,7 @@ TEST_F(RequestTest, TimeOutBeforeTheEventSaysHowToGoOn) {
 }
 
 TEST_F(RequestTest, TimeOutOfZeroIsNoLimit) {
-  endRequestsWith(daemon_, asked_, statusRow("t1", "START"));
+  endRequestsWith(daemon_, statusRow("t1", "START"));
   const VmqctlResult result = run({"start", "ux", "--transid", "t1", "--timeout", "0"});
   EXPECT_EQ(result.code, 0);
   EXPECT_EQ(result.err, asking + "accepted, waiting for its status event\n");

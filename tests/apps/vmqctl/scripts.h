@@ -1,6 +1,7 @@
 #pragma once
 // What scripted daemons say, in the words of the interface.
 
+#include <memory>
 #include <string>
 
 #include "tests/apps/vmqctl/scripted_daemon.h"
@@ -28,15 +29,16 @@ inline std::string refusal(const std::string& code, const std::string& message) 
 }
 
 /// Accepts every request and ends it with this status event, once the request is there.
-inline void endRequestsWith(ScriptedDaemon& daemon, Gate& asked, const std::string& row) {
-  daemon.on(eventsRequest, [&asked, row](Exchange& exchange) {
+inline void endRequestsWith(ScriptedDaemon& daemon, const std::string& row) {
+  const auto asked = std::make_shared<Gate>();  // the daemon's threads may outlive the test's own steps
+  daemon.on(eventsRequest, [asked, row](Exchange& exchange) {
     exchange.openStream();
-    if (!asked.wait()) return;
+    if (!asked->wait()) return;
     exchange.event("row", row);
     exchange.awaitClose();
   });
-  daemon.on(commandRequest, [&asked](Exchange& exchange) {
+  daemon.on(commandRequest, [asked](Exchange& exchange) {
     exchange.reply(200, answer());
-    asked.open();
+    asked->open();
   });
 }
